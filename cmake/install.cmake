@@ -1,0 +1,34 @@
+# Installs the library, its headers, a CMake package and a pkg-config file.
+include(CMakePackageConfigHelpers)
+
+install(TARGETS tessaline
+  EXPORT TessalineTargets
+  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+  INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+install(DIRECTORY ${PROJECT_SOURCE_DIR}/include/tessaline
+  DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+
+set(TESSALINE_CMAKE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/Tessaline)
+install(EXPORT TessalineTargets
+  NAMESPACE Tessaline::
+  DESTINATION ${TESSALINE_CMAKE_DIR})
+configure_package_config_file(
+  ${PROJECT_SOURCE_DIR}/cmake/TessalineConfig.cmake.in
+  ${PROJECT_BINARY_DIR}/TessalineConfig.cmake
+  INSTALL_DESTINATION ${TESSALINE_CMAKE_DIR})
+write_basic_package_version_file(
+  ${PROJECT_BINARY_DIR}/TessalineConfigVersion.cmake
+  COMPATIBILITY SameMajorVersion)
+install(FILES
+  ${PROJECT_BINARY_DIR}/TessalineConfig.cmake
+  ${PROJECT_BINARY_DIR}/TessalineConfigVersion.cmake
+  DESTINATION ${TESSALINE_CMAKE_DIR})
+
+# The .pc file finds its prefix relative to itself, so a staged or relocated
+# install (cmake --install --prefix, dpkg -x) works as well as the real one.
+file(RELATIVE_PATH TESSALINE_PC_TO_PREFIX
+  /${CMAKE_INSTALL_LIBDIR}/pkgconfig /)
+configure_file(${PROJECT_SOURCE_DIR}/cmake/tessaline.pc.in
+  ${PROJECT_BINARY_DIR}/tessaline.pc @ONLY)
+install(FILES ${PROJECT_BINARY_DIR}/tessaline.pc
+  DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)

@@ -1,0 +1,11 @@
+// One stop of the tour per subsystem.
+#ifndef TESSALINE_EXAMPLES_TOUR_H
+#define TESSALINE_EXAMPLES_TOUR_H
+
+void TourUtil();
+void TourConfig();
+void TourFiles();
+void TourCrypt();
+void TourThread();
+
+#endif

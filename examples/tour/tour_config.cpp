@@ -1,0 +1,3 @@
+#include "tour.h"
+
+void TourConfig() {}

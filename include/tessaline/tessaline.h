@@ -1,0 +1,14 @@
+/*
+ * Tessaline: the whole interface in one include.
+ *
+ * Subsystems: configuration store (config), paths and file services
+ * (files), text encryption (crypt), threads (thread), and text, numbers and
+ * time (util). Each header can also be included on its own.
+ */
+#ifndef TESSALINE_TESSALINE_H
+#define TESSALINE_TESSALINE_H
+
+#include "tessaline/util/export.h"
+#include "tessaline/thread/MThread.h"
+
+#endif
