@@ -9,6 +9,7 @@
 #define TESSALINE_TESSALINE_H
 
 #include "tessaline/util/export.h"
+#include "tessaline/files/rvFileApi.h"
 #include "tessaline/thread/MThread.h"
 
 #endif
