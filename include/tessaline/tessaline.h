@@ -11,5 +11,6 @@
 #include "tessaline/util/export.h"
 #include "tessaline/thread/MThread.h"
 #include "tessaline/util/rvString.h"
+#include "tessaline/util/rvTime.h"
 
 #endif
