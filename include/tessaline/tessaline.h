@@ -12,5 +12,6 @@
 #include "tessaline/thread/MThread.h"
 #include "tessaline/util/rvString.h"
 #include "tessaline/util/rvTime.h"
+#include "tessaline/util/HashToken.h"
 
 #endif
