@@ -88,6 +88,25 @@ inline bool Exists(const std::string& path)
     return lstat(path.c_str(), &info) == 0;
 }
 
+// Works in `directory` while the object lives.
+class ScopedCwd {
+public:
+    explicit ScopedCwd(const std::string& directory) : m_saved(std::filesystem::current_path())
+    {
+        std::filesystem::current_path(directory);
+    }
+    ~ScopedCwd()
+    {
+        std::error_code ignored;
+        std::filesystem::current_path(m_saved, ignored);
+    }
+    ScopedCwd(const ScopedCwd&) = delete;
+    ScopedCwd& operator=(const ScopedCwd&) = delete;
+
+private:
+    std::filesystem::path m_saved;
+};
+
 }  // namespace tessaline::test
 
 #endif
