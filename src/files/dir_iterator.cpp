@@ -122,12 +122,14 @@ rvDirIterator::~rvDirIterator()
 
 rvDirIterator& rvDirIterator::operator=(const rvDirIterator& other)
 {
-    if (other.m_rep != nullptr) {
-        ++other.m_rep->m_refs;
+    rvDirIterator_rep* rep = other.m_rep;
+    const char* name = other.m_name;
+    if (rep != nullptr) {
+        ++rep->m_refs;
     }
     LetGo(m_rep);
-    m_rep = other.m_rep;
-    m_name = other.m_name;
+    m_rep = rep;
+    m_name = name;
     return *this;
 }
 
