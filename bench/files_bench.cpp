@@ -1,6 +1,7 @@
 // The file services against the usual tools, in one run: copying one large
 // file, copying and removing a tree of many small files, and walking a large
-// directory by pattern. Peers: cp, rm -rf and std::filesystem.
+// directory by pattern. Peers: cp, rm -rf and std::filesystem. The tools run
+// as child processes, so all figures are wall-clock time.
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
@@ -247,16 +248,16 @@ void BM_Walk_std_filesystem(benchmark::State& state)
 
 }  // namespace
 
-BENCHMARK(BM_LargeFile_rvCopyFile)->Unit(benchmark::kMillisecond)->Iterations(5);
-BENCHMARK(BM_LargeFile_cp)->Unit(benchmark::kMillisecond)->Iterations(5);
-BENCHMARK(BM_LargeFile_std_filesystem)->Unit(benchmark::kMillisecond)->Iterations(5);
-BENCHMARK(BM_TreeCopy_rvCopyFile)->Unit(benchmark::kMillisecond)->Iterations(3);
-BENCHMARK(BM_TreeCopy_cp)->Unit(benchmark::kMillisecond)->Iterations(3);
-BENCHMARK(BM_TreeCopy_std_filesystem)->Unit(benchmark::kMillisecond)->Iterations(3);
-BENCHMARK(BM_TreeRemove_rvUnlink)->Unit(benchmark::kMillisecond)->Iterations(3);
-BENCHMARK(BM_TreeRemove_rm)->Unit(benchmark::kMillisecond)->Iterations(3);
-BENCHMARK(BM_TreeRemove_std_filesystem)->Unit(benchmark::kMillisecond)->Iterations(3);
-BENCHMARK(BM_Walk_rvDirIterator)->Unit(benchmark::kMillisecond)->Iterations(5);
-BENCHMARK(BM_Walk_std_filesystem)->Unit(benchmark::kMillisecond)->Iterations(5);
+BENCHMARK(BM_LargeFile_rvCopyFile)->Unit(benchmark::kMillisecond)->Iterations(5)->UseRealTime();
+BENCHMARK(BM_LargeFile_cp)->Unit(benchmark::kMillisecond)->Iterations(5)->UseRealTime();
+BENCHMARK(BM_LargeFile_std_filesystem)->Unit(benchmark::kMillisecond)->Iterations(5)->UseRealTime();
+BENCHMARK(BM_TreeCopy_rvCopyFile)->Unit(benchmark::kMillisecond)->Iterations(3)->UseRealTime();
+BENCHMARK(BM_TreeCopy_cp)->Unit(benchmark::kMillisecond)->Iterations(3)->UseRealTime();
+BENCHMARK(BM_TreeCopy_std_filesystem)->Unit(benchmark::kMillisecond)->Iterations(3)->UseRealTime();
+BENCHMARK(BM_TreeRemove_rvUnlink)->Unit(benchmark::kMillisecond)->Iterations(3)->UseRealTime();
+BENCHMARK(BM_TreeRemove_rm)->Unit(benchmark::kMillisecond)->Iterations(3)->UseRealTime();
+BENCHMARK(BM_TreeRemove_std_filesystem)->Unit(benchmark::kMillisecond)->Iterations(3)->UseRealTime();
+BENCHMARK(BM_Walk_rvDirIterator)->Unit(benchmark::kMillisecond)->Iterations(5)->UseRealTime();
+BENCHMARK(BM_Walk_std_filesystem)->Unit(benchmark::kMillisecond)->Iterations(5)->UseRealTime();
 
 BENCHMARK_MAIN();

@@ -67,6 +67,7 @@ void TourTree()
                 GetLastErrorText(reason, sizeof reason, 0xFFFFFFFFul));
 
     std::printf("removed the copy: %d files\n", rvUnlink(copy.c_str(), 1));
-    std::printf("removed the scratch directory: %d files, left behind: %d\n", rvUnlink(scratch, 1),
+    const int removed = rvUnlink(scratch, 1);
+    std::printf("removed the scratch directory: %d files, still there: %d\n", removed,
                 FileExists(scratch));
 }

@@ -295,5 +295,7 @@ TEST(GetLastErrorText, TextsForCodesAndBuffers)
     EXPECT_STREQ(std::strerror(EACCES), GetLastErrorText(nullptr, 0, 0xFFFFFFFFul));
     errno = EBADF;
     EXPECT_STREQ(std::strerror(EBADF), GetLastErrorText(nullptr, 0, static_cast<unsigned long>(-1)));
-    EXPECT_STREQ(std::strerror(9999), GetLastErrorText(nullptr, 0, 9999));
+    // An unknown code's text lives only until the next strerror call.
+    const std::string unknown = std::strerror(9999);
+    EXPECT_EQ(unknown, GetLastErrorText(nullptr, 0, 9999));
 }
