@@ -5,14 +5,14 @@
 
 #include <gtest/gtest.h>
 
+#include "files/file_fixtures.h"
 #include "files/sys.h"
-#include "files/temp_tree.h"
+#include "support/temp_dir.h"
 #include "tessaline/files/rvDirIterator.h"
 
+using namespace tessaline::test;
 using tessaline::files::ScopedSysCalls;
 using tessaline::files::Sys;
-using tessaline::test::ScopedCwd;
-using tessaline::test::TempTree;
 
 namespace {
 
@@ -27,168 +27,116 @@ Names Walk(const std::string& path)
     return names;
 }
 
-int OpenDescriptors()
+long OpenDescriptors()
 {
-    int count = 0;
-    for (const auto& entry : std::filesystem::directory_iterator("/proc/self/fd")) {
-        (void)entry;
-        ++count;
-    }
-    return count;
+    const std::filesystem::directory_iterator fds("/proc/self/fd");
+    return std::distance(begin(fds), end(fds));
 }
 
 class DirIteratorTest : public testing::Test {
 protected:
     void SetUp() override
     {
-        for (const char* name : {"a.log", "b.txt", ".hidden", ".log", "a.c", "b.c", "bb.c",
-                                 "report.txt", "with space.txt", "new\nline.txt"}) {
-            m_tree.Write(name, "x");
+        for (const char* name : {"a.log", ".log", ".hidden", "a.c", "b.c", "bb.c", "with space.txt",
+                                 "new\nline.txt"}) {
+            Put(m_dir / name, "x");
         }
-        m_tree.MakeDir("sub");
+        std::filesystem::create_directory(m_dir / "sub");
     }
 
-    std::string Path(const std::string& relative) const { return m_tree.Path(relative); }
-
-    TempTree m_tree;
+    TempDir m_dir;
 };
 
 }  // namespace
 
-TEST_F(DirIteratorTest, DirectoryAloneWalksEverythingOnce)
-{
-    const Names all = {".", "..", "a.log", "b.txt", ".hidden", ".log", "a.c", "b.c", "bb.c",
-                       "report.txt", "with space.txt", "new\nline.txt", "sub"};
-    EXPECT_EQ(all, Walk(m_tree.Root()));
-    EXPECT_EQ(all, Walk(m_tree.Root() + "/"));
-    EXPECT_EQ(all, Walk(m_tree.Root() + "/*"));
-    {
-        ScopedCwd cwd(m_tree.Root());
-        EXPECT_EQ(all, Walk("."));
-        EXPECT_EQ(Names({"a.log", ".log"}), Walk("./*.log"));
-    }
-}
-
 TEST_F(DirIteratorTest, PatternsMatchByFnmatch)
 {
+    const Names all = {".", "..", "a.log", ".log", ".hidden", "a.c", "b.c", "bb.c",
+                       "with space.txt", "new\nline.txt", "sub"};
     const struct {
-        const char* pattern;
+        std::string path;
         Names expected;
     } cases[] = {
-        {"*.log", {"a.log", ".log"}},
-        {"?.c", {"a.c", "b.c"}},
-        {"[ab].c", {"a.c", "b.c"}},
-        {"[!a]*.c", {"b.c", "bb.c"}},
-        {".*", {".", "..", ".hidden", ".log"}},
-        {"report.txt", {"report.txt"}},
-        {"with space.*", {"with space.txt"}},
-        {"new\nline.txt", {"new\nline.txt"}},
-        {"*.LOG", {}},
-        {"missing.txt", {}},
+        {m_dir.path(), all},
+        {m_dir.path() + "/", all},
+        {m_dir / "*.log", {"a.log", ".log"}},
+        {m_dir / "?.c", {"a.c", "b.c"}},
+        {m_dir / "[!a]*.c", {"b.c", "bb.c"}},
+        {m_dir / ".*", {".", "..", ".hidden", ".log"}},
+        {m_dir / "new\nline.txt", {"new\nline.txt"}},
+        {m_dir / "with space.*", {"with space.txt"}},
+        {m_dir / "*.LOG", {}},
+        {"/no/such/dir/*", {}},
+        {m_dir / "a.c/*", {}},
     };
     for (const auto& c : cases) {
-        SCOPED_TRACE(c.pattern);
-        EXPECT_EQ(c.expected, Walk(Path(c.pattern)));
+        SCOPED_TRACE(c.path);
+        EXPECT_EQ(c.expected, Walk(c.path));
     }
+    EXPECT_TRUE(rvDirIterator(nullptr) == rvDirIterator());
+
+    ScopedCwd cwd(m_dir.path());
+    EXPECT_EQ(all, Walk("."));
+    EXPECT_EQ(Names({"a.log", ".log"}), Walk("./*.log"));
+    EXPECT_EQ(Names(), Walk("*.log")) << "no directory part opens nothing";
 }
 
-TEST_F(DirIteratorTest, NothingToOpenIsTheEnd)
-{
-    const rvDirIterator end;
-    EXPECT_TRUE(rvDirIterator("/no/such/dir/*") == end);
-    EXPECT_TRUE(rvDirIterator(nullptr) == end);
-    EXPECT_TRUE(rvDirIterator(Path("b.txt/*").c_str()) == end) << "a path through a file";
-    ScopedCwd cwd(m_tree.Root());
-    EXPECT_TRUE(rvDirIterator("*.log") == end) << "no directory part opens nothing";
-    {
-        ScopedSysCalls restore;
-        Sys().opendir = [](const char*) -> DIR* {
-            errno = EACCES;
-            return nullptr;
-        };
-        EXPECT_TRUE(rvDirIterator(".") == end);
-    }
-}
-
-TEST_F(DirIteratorTest, ReadErrorEndsTheWalkWithItsCode)
+TEST_F(DirIteratorTest, FailuresEndTheWalk)
 {
     ScopedSysCalls restore;
-    static int reads;
-    reads = 0;
     static const auto realReaddir = Sys().readdir;
     Sys().readdir = [](DIR* dir) -> dirent* {
-        if (++reads > 1) {
+        static int reads = 0;
+        if (++reads % 2 == 0) {
             errno = EIO;
             return nullptr;
         }
         return realReaddir(dir);
     };
-    rvDirIterator it(m_tree.Root().c_str());
+    rvDirIterator it(m_dir.path().c_str());
     ASSERT_FALSE(it == rvDirIterator());
-    errno = 0;
     ++it;
     EXPECT_TRUE(it == rvDirIterator());
     EXPECT_EQ(EIO, errno);
+
+    Sys().opendir = [](const char*) -> DIR* {
+        errno = EACCES;
+        return nullptr;
+    };
+    EXPECT_TRUE(rvDirIterator(m_dir.path().c_str()) == rvDirIterator());
 }
 
-TEST_F(DirIteratorTest, CopiesShareOnePosition)
+TEST_F(DirIteratorTest, CopiesShareOneWalk)
 {
-    rvDirIterator first(m_tree.Root().c_str());
+    const long baseline = OpenDescriptors();
+    rvDirIterator first(m_dir.path().c_str());
     rvDirIterator copy(first);
     EXPECT_TRUE(copy == first);
-    EXPECT_FALSE(copy == rvDirIterator(m_tree.Root().c_str())) << "separate walks never equal";
+    EXPECT_FALSE(copy == rvDirIterator(m_dir.path().c_str())) << "separate walks never equal";
     EXPECT_FALSE(copy == rvDirIterator());
+    EXPECT_EQ(baseline + 1, OpenDescriptors()) << "one directory for all copies";
 
-    const std::string before = *first;
+    std::set<std::string> seen = {*first};
     ++copy;
-    EXPECT_NE(before, *copy);
-    EXPECT_EQ(std::string(*copy), *first) << "the shared buffer holds the new name";
-
+    EXPECT_EQ(std::string(*copy), *first) << "the other copy reads the new entry";
+    seen.insert(*copy);
     rvDirIterator old = first++;
-    EXPECT_TRUE(old == first) << "a post-increment copy shares the walk";
+    EXPECT_TRUE(old == first);
 
     rvDirIterator assigned;
     assigned = first;
     rvDirIterator& alias = assigned;
     assigned = alias;
     EXPECT_TRUE(assigned == first);
-    assigned = rvDirIterator();
-    EXPECT_TRUE(assigned == rvDirIterator());
-    EXPECT_TRUE(rvDirIterator() == rvDirIterator());
 
-    std::set<std::string> seen = {before};
-    int delivered = 1;
-    for (; first != rvDirIterator(); ++first, ++delivered) {
+    for (; first != rvDirIterator(); ++first) {
         seen.insert(*first);
     }
-    EXPECT_EQ(12, delivered) << "the entry skipped by ++copy is not delivered again";
-    EXPECT_EQ(12u, seen.size());
-    EXPECT_FALSE(copy == rvDirIterator()) << "other copies end on their own increment";
+    EXPECT_EQ(11u, seen.size()) << "every entry once, . and .. included";
+    EXPECT_EQ(baseline + 1, OpenDescriptors()) << "other copies still hold the walk";
     ++copy;
-    EXPECT_TRUE(copy == rvDirIterator());
+    EXPECT_TRUE(copy == rvDirIterator()) << "and end on their own increment";
     ++copy;
-    EXPECT_TRUE(copy == rvDirIterator()) << "advancing the end does nothing";
-}
-
-TEST_F(DirIteratorTest, DirectoryClosesWithTheLastReference)
-{
-    const int baseline = OpenDescriptors();
-    {
-        rvDirIterator first(m_tree.Root().c_str());
-        EXPECT_EQ(baseline + 1, OpenDescriptors());
-        {
-            rvDirIterator copy(first);
-            rvDirIterator another;
-            another = first;
-            EXPECT_EQ(baseline + 1, OpenDescriptors());
-        }
-        EXPECT_EQ(baseline + 1, OpenDescriptors()) << "left in the middle, still held";
-    }
-    EXPECT_EQ(baseline, OpenDescriptors());
-
-    rvDirIterator walk(m_tree.Root().c_str());
-    while (walk != rvDirIterator()) {
-        ++walk;
-    }
-    EXPECT_EQ(baseline, OpenDescriptors()) << "reaching the end lets go at once";
+    old = assigned = rvDirIterator();
+    EXPECT_EQ(baseline, OpenDescriptors()) << "the last reference closes the directory";
 }

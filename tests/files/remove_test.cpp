@@ -8,17 +8,15 @@
 
 #include <gtest/gtest.h>
 
+#include "files/file_fixtures.h"
 #include "files/sys.h"
-#include "files/temp_tree.h"
 #include "support/capture_stderr.h"
+#include "support/temp_dir.h"
 #include "tessaline/files/rvCopy.h"
-#include "tessaline/files/rvFileApi.h"
 
+using namespace tessaline::test;
 using tessaline::files::ScopedSysCalls;
 using tessaline::files::Sys;
-using tessaline::test::CaptureStderr;
-using tessaline::test::Exists;
-using tessaline::test::TempTree;
 
 namespace {
 
@@ -30,73 +28,54 @@ std::string CouldNotRemove(const std::string& path, int error)
 
 }  // namespace
 
-TEST(Unlink, FilesAndDirectories)
+TEST(Unlink, FilesTreesAndWildcards)
 {
-    TempTree tree;
+    TempDir dir;
     CaptureStderr capture;
-
-    EXPECT_EQ(0, rvUnlink(tree.Path("missing").c_str(), 1));
-    EXPECT_EQ(0, rvUnlink(nullptr, 1));
-
-    const std::string readOnly = tree.Write("read only.txt", "x");
+    EXPECT_EQ(0, rvUnlink((dir / "missing").c_str(), 1));
+    const std::string readOnly = Put(dir / "read only", "x");
     chmod(readOnly.c_str(), 0444);
     EXPECT_EQ(1, rvUnlink(readOnly.c_str(), 0));
     EXPECT_FALSE(Exists(readOnly));
 
-    const std::string directory = tree.MakeDir("dir");
-    EXPECT_EQ(0, rvUnlink(directory.c_str(), 0));
-    EXPECT_TRUE(Exists(directory));
-    EXPECT_EQ(0, rvUnlink(directory.c_str(), 1)) << "an empty directory counts nothing";
-    EXPECT_FALSE(Exists(directory));
-
-    tree.Write("tree/a", "1");
-    tree.Write("tree/sub/b c", "2");
-    tree.Write("tree/sub/deeper/new\nline", "3");
-    EXPECT_EQ(3, rvUnlink(tree.Path("tree").c_str(), 1));
-    EXPECT_FALSE(Exists(tree.Path("tree")));
-
-    EXPECT_EQ(CouldNotRemove(directory, EISDIR), capture.Text());
-}
-
-TEST(Unlink, Wildcards)
-{
-    TempTree tree;
-    tree.Write("x/a.txt", "1");
-    tree.Write("x/b.log", "2");
-    tree.Write("x/sub/c.txt", "3");
-
-    EXPECT_EQ(1, rvUnlink(tree.Path("x/*.txt").c_str(), 0));
-    EXPECT_EQ(1, rvUnlink(tree.Path("x/*").c_str(), 0));
-    EXPECT_TRUE(Exists(tree.Path("x/sub/c.txt"))) << "recurse 0 leaves directories";
-    EXPECT_EQ(1, rvUnlink(tree.Path("x/*").c_str(), 1));
-    EXPECT_FALSE(Exists(tree.Path("x/sub")));
-    EXPECT_TRUE(Exists(tree.Path("x"))) << "the directory of the pattern stays";
-    EXPECT_EQ(0, rvUnlink(tree.Path("no/such/*").c_str(), 1));
+    Put(dir / "t/a.txt", "1");
+    Put(dir / "t/b.log", "2");
+    Put(dir / "t/sub/c d", "3");
+    Put(dir / "t/sub/deeper/new\nline", "4");
+    EXPECT_EQ(0, rvUnlink((dir / "t").c_str(), 0)) << "a directory needs recurse 1";
+    EXPECT_EQ(1, rvUnlink((dir / "t/*.txt").c_str(), 0));
+    EXPECT_EQ(1, rvUnlink((dir / "t/*").c_str(), 0));
+    EXPECT_TRUE(Exists(dir / "t/sub")) << "recurse 0 leaves directories";
+    EXPECT_EQ(2, rvUnlink((dir / "t/*").c_str(), 1));
+    EXPECT_TRUE(Exists(dir / "t")) << "the directory of the pattern stays";
+    EXPECT_EQ(0, rvUnlink((dir / "t").c_str(), 1)) << "an empty directory counts nothing";
+    EXPECT_FALSE(Exists(dir / "t"));
+    EXPECT_EQ(CouldNotRemove(dir / "t", EISDIR), capture.Text());
 }
 
 TEST(Unlink, LinksGoAsLinks)
 {
-    TempTree tree;
-    tree.Write("real/kept.txt", "keep");
-    symlink(tree.Path("real").c_str(), tree.Path("to-dir").c_str());
-    EXPECT_EQ(0, rvUnlink(tree.Path("to-dir").c_str(), 1));
-    EXPECT_FALSE(Exists(tree.Path("to-dir")));
-    EXPECT_TRUE(Exists(tree.Path("real/kept.txt")));
+    TempDir dir;
+    Put(dir / "real/kept", "keep");
+    symlink((dir / "real").c_str(), (dir / "to-dir").c_str());
+    EXPECT_EQ(0, rvUnlink((dir / "to-dir").c_str(), 1));
+    EXPECT_FALSE(Exists(dir / "to-dir"));
+    EXPECT_TRUE(Exists(dir / "real/kept"));
 
-    // A dangling link fails the existence test that follows links, so it is
-    // left, silently, like any missing path.
-    symlink(tree.Path("gone").c_str(), tree.Path("dangling").c_str());
+    // A dangling link fails the existence test, which follows links, so it
+    // stays like any missing path, in silence.
+    symlink((dir / "gone").c_str(), (dir / "dangling").c_str());
     CaptureStderr capture;
-    EXPECT_EQ(0, rvUnlink(tree.Path("dangling").c_str(), 1));
-    EXPECT_TRUE(Exists(tree.Path("dangling")));
+    EXPECT_EQ(0, rvUnlink((dir / "dangling").c_str(), 1));
+    EXPECT_TRUE(Exists(dir / "dangling"));
     EXPECT_EQ("", capture.Text());
 }
 
-TEST(Unlink, FailuresAreCountedAndReported)
+TEST(Unlink, FailedMembersAreReportedAndSkipped)
 {
-    TempTree tree;
-    tree.Write("t/stuck", "1");
-    tree.Write("t/free", "2");
+    TempDir dir;
+    Put(dir / "t/stuck", "1");
+    Put(dir / "t/free", "2");
     ScopedSysCalls restore;
     static const auto realUnlink = Sys().unlink;
     Sys().unlink = [](const char* path) {
@@ -108,50 +87,43 @@ TEST(Unlink, FailuresAreCountedAndReported)
         return realUnlink(path);
     };
     CaptureStderr capture;
-    EXPECT_EQ(1, rvUnlink(tree.Path("t").c_str(), 1));
-    EXPECT_EQ(CouldNotRemove(tree.Path("t/stuck"), EACCES), capture.Text());
-    EXPECT_TRUE(Exists(tree.Path("t/stuck"))) << "the directory stays, not empty";
-    EXPECT_FALSE(Exists(tree.Path("t/free")));
+    EXPECT_EQ(1, rvUnlink((dir / "t").c_str(), 1));
+    EXPECT_EQ(CouldNotRemove(dir / "t/stuck", EACCES), capture.Text());
+    EXPECT_TRUE(Exists(dir / "t/stuck"));
+    EXPECT_FALSE(Exists(dir / "t/free"));
 }
 
 TEST(CompareDirectories, SecondMustCoverFirst)
 {
-    TempTree tree;
-    tree.Write("a/one", "123");
-    tree.Write("a/sub/two", "45");
-    tree.Write("b/one", "abc");
-    tree.Write("b/sub/two", "de");
-    tree.Write("b/extra", "only in b");
-    const std::string a = tree.Path("a");
-    const std::string b = tree.Path("b");
-
+    TempDir dir;
+    Put(dir / "a/one", "123");
+    Put(dir / "a/sub/two", "45");
+    Put(dir / "b/one", "abc");
+    Put(dir / "b/sub/two", "de");
+    Put(dir / "b/extra", "only in b");
+    const std::string a = dir / "a";
+    const std::string b = dir / "b";
     EXPECT_EQ(1, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "sizes, not contents";
     EXPECT_EQ(0, CompareDirectoriesByFileSize(b.c_str(), a.c_str())) << "one-way";
-    EXPECT_EQ(1, CompareDirectoriesByFileSize(tree.Path("none").c_str(), b.c_str()));
-    EXPECT_EQ(0, CompareDirectoriesByFileSize(a.c_str(), tree.Path("none").c_str()));
-
-    tree.Write("b/sub/two", "longer");
+    EXPECT_EQ(1, CompareDirectoriesByFileSize((dir / "none").c_str(), b.c_str()));
+    EXPECT_EQ(0, CompareDirectoriesByFileSize(a.c_str(), (dir / "none").c_str()));
+    Put(dir / "b/sub/two", "longer");
     EXPECT_EQ(0, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "a deeper size differs";
-    tree.Write("b/sub/two", "de");
-
-    tree.MakeDir("a/kind");
-    tree.Write("b/kind", "");
+    Put(dir / "b/sub/two", "de");
+    std::filesystem::create_directory(dir / "a/kind");
+    Put(dir / "b/kind", "");
     EXPECT_EQ(0, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "directory against file";
 }
 
 TEST(FileSize, ByNameAndByHandle)
 {
-    TempTree tree;
-    const std::string path = tree.Write("dir/sized.bin", std::string(1234, 'x'));
+    TempDir dir;
+    const std::string path = Put(dir / "d/sized", std::string(1234, 'x'));
     EXPECT_EQ(1234, rvGetFileSize(path.c_str()));
-    EXPECT_EQ(1234, rvGetFileSize((tree.Root() + "\\dir\\sized.bin").c_str()))
-        << "backslashes are accepted";
-    EXPECT_EQ(0, rvGetFileSize(tree.Path("missing").c_str()));
-    EXPECT_EQ(0, rvGetFileSize(nullptr));
-
+    EXPECT_EQ(1234, rvGetFileSize((dir.path() + "\\d\\sized").c_str())) << "backslashes";
+    EXPECT_EQ(0, rvGetFileSize((dir / "missing").c_str()));
     const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
-    void* handle = reinterpret_cast<void*>(static_cast<intptr_t>(fd));
-    EXPECT_EQ(1234, rvGetFileSize64(handle));
+    EXPECT_EQ(1234, rvGetFileSize64(reinterpret_cast<void*>(static_cast<intptr_t>(fd))));
     close(fd);
     EXPECT_EQ(-1, rvGetFileSize64(reinterpret_cast<void*>(static_cast<intptr_t>(-1))));
 }
