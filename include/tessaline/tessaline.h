@@ -13,5 +13,6 @@
 #include "tessaline/util/rvString.h"
 #include "tessaline/util/rvTime.h"
 #include "tessaline/util/HashToken.h"
+#include "tessaline/files/rvFilename.h"
 
 #endif
