@@ -14,5 +14,6 @@
 #include "tessaline/util/rvTime.h"
 #include "tessaline/util/HashToken.h"
 #include "tessaline/files/rvFilename.h"
+#include "tessaline/files/rvPath.h"
 
 #endif
