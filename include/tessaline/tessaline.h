@@ -15,5 +15,6 @@
 #include "tessaline/util/HashToken.h"
 #include "tessaline/files/rvFilename.h"
 #include "tessaline/files/rvPath.h"
+#include "tessaline/files/rvSharedLib.h"
 
 #endif
