@@ -100,6 +100,8 @@ rvFilename::rvFilename(const rvFilename& other) : rvFilename(nullptr, 0)
 
 rvFilename& rvFilename::operator=(const rvFilename& other)
 {
+    if (this == &other)
+        return *this;
     return *this = other.m_pPath;
 }
 
