@@ -41,10 +41,10 @@ TEST(CaseConvert, HighBytesFollowTheLocale)
 
 TEST(LowerTable, LowersOnlyAsciiLetters)
 {
-    EXPECT_EQ('a', rv_lowerTable['A']);
-    EXPECT_EQ('z', rv_lowerTable['Z']);
-    EXPECT_EQ('@', rv_lowerTable['@']);
-    EXPECT_EQ('[', rv_lowerTable['[']);
+    EXPECT_EQ('a', rv_lowerTable[int('A')]);
+    EXPECT_EQ('z', rv_lowerTable[int('Z')]);
+    EXPECT_EQ('@', rv_lowerTable[int('@')]);
+    EXPECT_EQ('[', rv_lowerTable[int('[')]);
     EXPECT_EQ(0xc4, rv_lowerTable[0xc4]);
 }
 
