@@ -1,13 +1,17 @@
-// The platform calls of the file services, routed through one table so that
-// tests can make any of them fail on demand. The library reads the table on
-// every call; tests swap entries under a ScopedSysCalls and the old table
+// The platform calls of the files subsystem, routed through one table so
+// that tests can make any of them fail on demand. The library reads the table
+// on every call; tests swap entries under a ScopedSysCalls and the old table
 // comes back when it goes out of scope. Not part of the installed interface.
+//
+// Each call returns what the platform call returns and leaves its errno
+// untouched, so callers read the cause of a failure right after the call.
 #ifndef TESSALINE_SRC_FILES_SYS_H
 #define TESSALINE_SRC_FILES_SYS_H
 
 #include <dirent.h>
 #include <sys/stat.h>
 #include <sys/types.h>
+#include <sys/vfs.h>
 #include <time.h>
 
 #include "tessaline/util/export.h"
@@ -25,9 +29,13 @@ struct SysCalls {
     int (*lockf)(int fd, int command, off_t length);
     int (*access)(const char* path, int mode);
     int (*chmod)(const char* path, mode_t mode);
+    int (*mkdir)(const char* path, mode_t mode);
     int (*unlink)(const char* path);
     int (*rmdir)(const char* path);
     int (*symlink)(const char* existing, const char* created);
+    // realpath into a caller's area of PATH_MAX bytes.
+    char* (*realpath)(const char* path, char* resolved);
+    int (*statfs)(const char* path, struct statfs* info);
     int (*nanosleep)(const struct timespec* pause, struct timespec* left);
     DIR* (*opendir)(const char* path);
     struct dirent* (*readdir)(DIR* dir);
@@ -50,6 +58,23 @@ public:
 private:
     SysCalls m_saved;
 };
+
+namespace sys {
+
+int Stat(const char* path, struct stat* info);
+int Access(const char* path, int mode);
+int MakeDirectory(const char* path, mode_t mode);
+// realpath into a caller's area of PATH_MAX bytes.
+char* ResolvePath(const char* path, char* resolved);
+int FileSystemStatus(const char* path, struct statfs* info);
+
+void* OpenLibrary(const char* name, int mode);
+int CloseLibrary(void* handle);
+void* LibrarySymbol(void* handle, const char* symbol);
+// Clears the loader's pending message, keeping errno.
+void DiscardLibraryError();
+
+}  // namespace sys
 
 }  // namespace tessaline::files
 
