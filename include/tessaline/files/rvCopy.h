@@ -73,8 +73,8 @@ TESSALINE_API int rvCopyFile(const char* source, const char* target, unsigned in
 // one line on the standard error stream,
 // "rvUnlink: Could not remove <path>: <platform text> (<errno>).", and adds 0;
 // so does a directory given with `recurse` other than 1. Missing paths and
-// directories that stay (not empty) are silent. A null `path` removes
-// nothing.
+// directories that stay (not empty) are silent. A dangling symbolic link
+// counts as missing and stays. A null `path` removes nothing.
 TESSALINE_API int rvUnlink(const char* path, unsigned int recurse);
 
 // 1 when every entry under `first` has an entry of the same name, kind and
