@@ -44,46 +44,82 @@ struct Block {
     uint32_t w[4];
 };
 
-// Both directions take the round subkeys from the end of the array: a key
-// turned for encryption holds them last first.
-TESSALINE_ALWAYS_INLINE void encryptWords(const uint32_t* s, const uint32_t* k, int rounds, Block& b)
+// One round pair on `Lanes` independent blocks at once: the table reads of
+// one block overlap the dependent chain of another. Both directions take the
+// round subkeys from the end of the array: a key turned for encryption holds
+// them last first.
+template <int Lanes>
+TESSALINE_ALWAYS_INLINE void encryptLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
 {
-    uint32_t x0 = b.w[0] ^ k[0], x1 = b.w[1] ^ k[1], x2 = b.w[2] ^ k[2], x3 = b.w[3] ^ k[3];
+    uint32_t x0[Lanes], x1[Lanes], x2[Lanes], x3[Lanes];
+#pragma GCC unroll 4
+    for (int l = 0; l < Lanes; ++l) {
+        x0[l] = b[l].w[0] ^ k[0];
+        x1[l] = b[l].w[1] ^ k[1];
+        x2[l] = b[l].w[2] ^ k[2];
+        x3[l] = b[l].w[3] ^ k[3];
+    }
     const uint32_t* roundKey = k + kSubkeyWords - 2;
     for (int r = 0; r < rounds; r += 2, roundKey -= 4) {
-        uint32_t t0 = g(s, x0);
-        uint32_t t1 = gRotated(s, x1);
-        x2 = rotateRight(x2 ^ (t0 + t1 + roundKey[0]), 1);
-        x3 = rotateLeft(x3, 1) ^ (t0 + 2 * t1 + roundKey[1]);
-        t0 = g(s, x2);
-        t1 = gRotated(s, x3);
-        x0 = rotateRight(x0 ^ (t0 + t1 + roundKey[-2]), 1);
-        x1 = rotateLeft(x1, 1) ^ (t0 + 2 * t1 + roundKey[-1]);
+#pragma GCC unroll 4
+        for (int l = 0; l < Lanes; ++l) {
+            const uint32_t t0 = g(s, x0[l]);
+            const uint32_t t1 = gRotated(s, x1[l]);
+            x2[l] = rotateRight(x2[l] ^ (t0 + t1 + roundKey[0]), 1);
+            x3[l] = rotateLeft(x3[l], 1) ^ (t0 + 2 * t1 + roundKey[1]);
+        }
+#pragma GCC unroll 4
+        for (int l = 0; l < Lanes; ++l) {
+            const uint32_t t0 = g(s, x2[l]);
+            const uint32_t t1 = gRotated(s, x3[l]);
+            x0[l] = rotateRight(x0[l] ^ (t0 + t1 + roundKey[-2]), 1);
+            x1[l] = rotateLeft(x1[l], 1) ^ (t0 + 2 * t1 + roundKey[-1]);
+        }
     }
-    b.w[0] = x2 ^ k[4];
-    b.w[1] = x3 ^ k[5];
-    b.w[2] = x0 ^ k[6];
-    b.w[3] = x1 ^ k[7];
+#pragma GCC unroll 4
+    for (int l = 0; l < Lanes; ++l) {
+        b[l].w[0] = x2[l] ^ k[4];
+        b[l].w[1] = x3[l] ^ k[5];
+        b[l].w[2] = x0[l] ^ k[6];
+        b[l].w[3] = x1[l] ^ k[7];
+    }
 }
 
-TESSALINE_ALWAYS_INLINE void decryptWords(const uint32_t* s, const uint32_t* k, int rounds, Block& b)
+template <int Lanes>
+TESSALINE_ALWAYS_INLINE void decryptLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
 {
-    uint32_t x0 = b.w[0] ^ k[4], x1 = b.w[1] ^ k[5], x2 = b.w[2] ^ k[6], x3 = b.w[3] ^ k[7];
+    uint32_t x0[Lanes], x1[Lanes], x2[Lanes], x3[Lanes];
+#pragma GCC unroll 4
+    for (int l = 0; l < Lanes; ++l) {
+        x0[l] = b[l].w[0] ^ k[4];
+        x1[l] = b[l].w[1] ^ k[5];
+        x2[l] = b[l].w[2] ^ k[6];
+        x3[l] = b[l].w[3] ^ k[7];
+    }
     const uint32_t* roundKey = k + kWhiteningWords + 2 * (rounds - 1);
     for (int r = 0; r < rounds; r += 2, roundKey -= 4) {
-        uint32_t t0 = g(s, x0);
-        uint32_t t1 = gRotated(s, x1);
-        x2 = rotateLeft(x2, 1) ^ (t0 + t1 + roundKey[0]);
-        x3 = rotateRight(x3 ^ (t0 + 2 * t1 + roundKey[1]), 1);
-        t0 = g(s, x2);
-        t1 = gRotated(s, x3);
-        x0 = rotateLeft(x0, 1) ^ (t0 + t1 + roundKey[-2]);
-        x1 = rotateRight(x1 ^ (t0 + 2 * t1 + roundKey[-1]), 1);
+#pragma GCC unroll 4
+        for (int l = 0; l < Lanes; ++l) {
+            const uint32_t t0 = g(s, x0[l]);
+            const uint32_t t1 = gRotated(s, x1[l]);
+            x2[l] = rotateLeft(x2[l], 1) ^ (t0 + t1 + roundKey[0]);
+            x3[l] = rotateRight(x3[l] ^ (t0 + 2 * t1 + roundKey[1]), 1);
+        }
+#pragma GCC unroll 4
+        for (int l = 0; l < Lanes; ++l) {
+            const uint32_t t0 = g(s, x2[l]);
+            const uint32_t t1 = gRotated(s, x3[l]);
+            x0[l] = rotateLeft(x0[l], 1) ^ (t0 + t1 + roundKey[-2]);
+            x1[l] = rotateRight(x1[l] ^ (t0 + 2 * t1 + roundKey[-1]), 1);
+        }
     }
-    b.w[0] = x2 ^ k[0];
-    b.w[1] = x3 ^ k[1];
-    b.w[2] = x0 ^ k[2];
-    b.w[3] = x1 ^ k[3];
+#pragma GCC unroll 4
+    for (int l = 0; l < Lanes; ++l) {
+        b[l].w[0] = x2[l] ^ k[0];
+        b[l].w[1] = x3[l] ^ k[1];
+        b[l].w[2] = x0[l] ^ k[2];
+        b[l].w[3] = x1[l] ^ k[3];
+    }
 }
 
 TESSALINE_ALWAYS_INLINE Block loadBlock(const unsigned char* p)
@@ -99,26 +135,54 @@ TESSALINE_ALWAYS_INLINE void storeBlock(unsigned char* p, const Block& b)
 
 enum class Direction { kEncrypt, kDecrypt };
 
-template <Direction D>
-TESSALINE_ALWAYS_INLINE void runBlocks(const uint32_t* s, const uint32_t* k, int rounds, bool chained,
-                                       uint32_t* chain, const unsigned char* in, int inputLen,
-                                       unsigned char* out)
+template <Direction D, int Lanes>
+TESSALINE_ALWAYS_INLINE void cipherLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
 {
-    for (int n = 0; n < inputLen; n += BLOCK_SIZE, in += kBlockBytes, out += kBlockBytes) {
+    if (D == Direction::kEncrypt)
+        encryptLanes<Lanes>(s, k, rounds, b);
+    else
+        decryptLanes<Lanes>(s, k, rounds, b);
+}
+
+// Electronic code book: blocks are independent, so they go four at a time.
+template <Direction D>
+TESSALINE_ALWAYS_INLINE void runCodeBook(const uint32_t* s, const uint32_t* k, int rounds, long blocks,
+                                         const unsigned char* in, unsigned char* out)
+{
+    constexpr int kLanes = 4;
+    for (; blocks >= kLanes; blocks -= kLanes, in += kLanes * kBlockBytes, out += kLanes * kBlockBytes) {
+        Block b[kLanes];
+        for (int l = 0; l < kLanes; ++l)
+            b[l] = loadBlock(in + l * kBlockBytes);
+        cipherLanes<D, kLanes>(s, k, rounds, b);
+        for (int l = 0; l < kLanes; ++l)
+            storeBlock(out + l * kBlockBytes, b[l]);
+    }
+    for (; blocks > 0; --blocks, in += kBlockBytes, out += kBlockBytes) {
+        Block b = loadBlock(in);
+        cipherLanes<D, 1>(s, k, rounds, &b);
+        storeBlock(out, b);
+    }
+}
+
+// Cipher block chaining on block words, with the chaining value in `chain`.
+template <Direction D>
+void runChained(const uint32_t* s, const uint32_t* k, int rounds, long blocks, uint32_t* chain,
+                const unsigned char* in, unsigned char* out)
+{
+    for (; blocks > 0; --blocks, in += kBlockBytes, out += kBlockBytes) {
         Block b = loadBlock(in);
         if (D == Direction::kEncrypt) {
             for (int i = 0; i < 4; ++i)
                 b.w[i] ^= chain[i];
-            encryptWords(s, k, rounds, b);
-            if (chained)
-                std::memcpy(chain, b.w, sizeof b.w);
+            encryptLanes<1>(s, k, rounds, &b);
+            std::memcpy(chain, b.w, sizeof b.w);
         } else {
             const Block cipherWords = b;
-            decryptWords(s, k, rounds, b);
+            decryptLanes<1>(s, k, rounds, &b);
             for (int i = 0; i < 4; ++i)
                 b.w[i] ^= chain[i];
-            if (chained)
-                std::memcpy(chain, cipherWords.w, sizeof cipherWords.w);
+            std::memcpy(chain, cipherWords.w, sizeof cipherWords.w);
         }
         storeBlock(out, b);
     }
@@ -162,22 +226,25 @@ int process(cipherInstance* cipher, keyInstance* key, const unsigned char* input
     if (key->direction != direction)
         ReverseRoundSubkeys(key, direction);
 
+    if (inputLen <= 0)
+        return inputLen;
+    // A last partial block counts as a whole one.
+    const long blocks = (inputLen - 1L) / BLOCK_SIZE + 1;
     uint32_t subkeys[kSubkeyWords];
     std::memcpy(subkeys, key->subKeys, sizeof subkeys);
-    const bool chained = cipher->mode == MODE_CBC;
-    uint32_t chain[4] = {0, 0, 0, 0};
-    if (chained)
-        std::memcpy(chain, cipher->iv32, sizeof chain);
-
     const uint32_t* s = &key->sBox8x32[0][0];
     const int rounds = roundsOf(key);
-    if (rounds == kMaxRounds)
-        runBlocks<D>(s, subkeys, kMaxRounds, chained, chain, input, inputLen, out);
-    else
-        runBlocks<D>(s, subkeys, rounds, chained, chain, input, inputLen, out);
 
-    if (chained)
+    if (cipher->mode == MODE_CBC) {
+        uint32_t chain[4];
+        std::memcpy(chain, cipher->iv32, sizeof chain);
+        runChained<D>(s, subkeys, rounds, blocks, chain, input, out);
         std::memcpy(cipher->iv32, chain, sizeof chain);
+    } else if (rounds == kMaxRounds) {
+        runCodeBook<D>(s, subkeys, kMaxRounds, blocks, input, out);
+    } else {
+        runCodeBook<D>(s, subkeys, rounds, blocks, input, out);
+    }
     return inputLen;
 }
 
