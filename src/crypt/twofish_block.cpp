@@ -60,6 +60,7 @@ TESSALINE_ALWAYS_INLINE void encryptLanes(const uint32_t* s, const uint32_t* k, 
         x3[l] = b[l].w[3] ^ k[3];
     }
     const uint32_t* roundKey = k + kSubkeyWords - 2;
+#pragma GCC unroll 8
     for (int r = 0; r < rounds; r += 2, roundKey -= 4) {
 #pragma GCC unroll 4
         for (int l = 0; l < Lanes; ++l) {
@@ -97,6 +98,7 @@ TESSALINE_ALWAYS_INLINE void decryptLanes(const uint32_t* s, const uint32_t* k, 
         x3[l] = b[l].w[3] ^ k[7];
     }
     const uint32_t* roundKey = k + kWhiteningWords + 2 * (rounds - 1);
+#pragma GCC unroll 8
     for (int r = 0; r < rounds; r += 2, roundKey -= 4) {
 #pragma GCC unroll 4
         for (int l = 0; l < Lanes; ++l) {

@@ -48,8 +48,10 @@ TESSALINE_API int TwoFishEncrypt(char* key, unsigned char* data, unsigned long l
 // accepted; a pair that is not hexadecimal takes the value strtoul gives it.
 // A last odd character is dropped, and of text that is not a whole number
 // of blocks only the whole blocks are deciphered (shorter text gives an
-// empty payload); nothing is read or written past either buffer. Null
-// arguments give 0.
+// empty payload); nothing is read or written past either buffer. A stored
+// length that disagrees with the text (wrong key, altered digits) is cut to
+// T - 4 bytes for text of T characters, bytes past the deciphered blocks
+// reading as 0. Null arguments, and text of 2^29 characters or more, give 0.
 TESSALINE_API int TwoFishDecrypt(char* key, char* text, unsigned char* out, unsigned long* length);
 
 // Marked text of `length` bytes of `data` under the fixed key, into `out`

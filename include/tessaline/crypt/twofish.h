@@ -165,10 +165,11 @@ TESSALINE_API extern int debug;               /* 0; nothing reads it */
 TESSALINE_API extern int debugCompile;        /* 0; nothing reads it */
 
 /* Records direction and keyLen (rounded up to a multiple of 64 bits), sets
-   numRounds from the table (sizes above 256 bits count as 256, sizes of 0 or
-   less as 64), clears key32 and stores a NUL at keyMaterial[64]. With a null
-   or empty keyMaterial returns TRUE: set key32 and call reKey next. Key text
-   is always refused with BAD_KEY_MAT, as is a null key. */
+   numRounds from the table (sizes above 256 bits take the 256-bit entry;
+   64 bits or less, 0 and negative sizes included, get 0 rounds), clears
+   key32 and stores a NUL at keyMaterial[64]. With a null or empty
+   keyMaterial returns TRUE: set key32 and call reKey next. Key text is
+   always refused with BAD_KEY_MAT, as is a null key. */
 TESSALINE_API int makeKey(keyInstance* key, unsigned char direction, int keyLen,
                           char* keyMaterial);
 
