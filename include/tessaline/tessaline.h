@@ -12,5 +12,11 @@
 #include "tessaline/crypt/twofish.h"
 #include "tessaline/crypt/rvEncrypt.h"
 #include "tessaline/thread/MThread.h"
+#include "tessaline/util/rvString.h"
+#include "tessaline/util/rvTime.h"
+#include "tessaline/util/HashToken.h"
+#include "tessaline/files/rvFilename.h"
+#include "tessaline/files/rvPath.h"
+#include "tessaline/files/rvSharedLib.h"
 
 #endif
