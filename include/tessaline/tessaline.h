@@ -10,5 +10,8 @@
 
 #include "tessaline/util/export.h"
 #include "tessaline/thread/MThread.h"
+#include "tessaline/util/rvString.h"
+#include "tessaline/util/rvTime.h"
+#include "tessaline/util/HashToken.h"
 
 #endif
