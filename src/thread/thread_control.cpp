@@ -1,6 +1,7 @@
 // MThread: acting on a running thread from outside, and the operations on
 // the calling thread.
 #include <cerrno>
+#include <csignal>
 #include <sched.h>
 
 #include "thread/relaxed.h"

@@ -417,6 +417,8 @@ public:
     // Copies every value, m_lastError included, but has a mutex and a
     // condition of its own. The copy doesn't control the thread's wake-ups:
     // its timed Wait only sees a thread that had finished when it was made.
+    // Once one object has joined the thread, the others' m_thread is stale:
+    // set it to 0 before using or destroying them.
     MThread(const MThread& other);
     // Copies m_routine, m_arg, m_cancelled, m_thread, m_attr and m_finished;
     // m_state, m_priority and m_lastError stay.
