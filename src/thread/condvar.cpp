@@ -43,6 +43,8 @@ timespec deadlineAfter(long timeout)
 
 }  // namespace
 
+MCondVar_::MCondVar_() = default;
+
 MCondVar::MCondVar() : m_cond(), m_attr()
 {
     Create(nullptr);

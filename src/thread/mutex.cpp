@@ -29,15 +29,16 @@ void storeErrno(int* err)
 // concurrent failure on another thread may already have overwritten.
 int record(MThreadError& object, int result)
 {
-    object.StoreLastError(result);
+    tessaline::storeRelaxed(object.m_lastError, result);
     return result;
 }
 
-// The tail of Lock, Try and Unlock.
+// The tail of Lock, Try and Unlock. Success, by far the common case, needs no
+// call into the exported (and so interposable) reporting function.
 int finish(int result, int* err)
 {
     storeErrno(err);
-    return CHECK_SYSERROR(result);
+    return result == 0 ? 0 : CHECK_SYSERROR(result);
 }
 
 // Lock and Try of the checked and recursive types.

@@ -17,6 +17,8 @@ int codeOf(int result)
 
 }  // namespace
 
+MSemaphore_::MSemaphore_() = default;
+
 long MSemaphore_::Count()
 {
     return -1;

@@ -3,6 +3,8 @@
 
 #include "tessaline/thread/MThread.h"
 
+MThreadKey_::MThreadKey_() = default;
+
 MThreadKey::MThreadKey() : m_key(0), m_bHasKey(false) {}
 
 MThreadKey::~MThreadKey()

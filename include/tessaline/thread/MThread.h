@@ -144,6 +144,7 @@ public:
 // Abstract condition variable interface.
 class TESSALINE_API MCondVar_ : public MThreadError {
 public:
+    MCondVar_();
     virtual int Create(int* err) = 0;
     virtual int Wait(MMutex_& mutex, int* err, long timeout) = 0;
     virtual int Broadcast(int* err) = 0;
@@ -210,6 +211,7 @@ public:
 // Abstract counting semaphore interface.
 class TESSALINE_API MSemaphore_ : public MThreadError {
 public:
+    MSemaphore_();
     virtual int Init(long count) = 0;
     virtual int Wait() = 0;
     virtual int Try() = 0;
@@ -277,6 +279,7 @@ private:
 // Abstract thread-specific data interface.
 class TESSALINE_API MThreadKey_ : public MThreadError {
 public:
+    MThreadKey_();
     virtual int Create(void (*destructor)(), int, int*) = 0;
     virtual int SetValue(void* value, int* err) = 0;
     virtual void* GetValue(int* err) = 0;
