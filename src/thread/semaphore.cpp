@@ -24,7 +24,7 @@ long MSemaphore_::Count()
     return -1;
 }
 
-MSemaphore::MSemaphore(long count, int shared) : m_shared(shared), m_sem(), m_bInitialised(false)
+MSemaphore::MSemaphore(long count, int shared) noexcept : m_shared(shared), m_sem(), m_bInitialised(false)
 {
     if (count > 0) {
         Init(count);

@@ -135,6 +135,9 @@ MThread::MThread(const MThread& other)
 
 MThread& MThread::operator=(const MThread& other)
 {
+    if (this == &other) {
+        return *this;
+    }
     m_routine = other.m_routine;
     m_arg = other.m_arg;
     storeRelaxed(m_cancelled, loadRelaxed(other.m_cancelled));
@@ -194,7 +197,8 @@ void* MThread::ThreadRoutineWrapper(MThread* thread)
 {
     if (thread->m_routine == nullptr) {
         markFinished(*thread);
-        return reinterpret_cast<void*>(-1);
+        // The classic "no routine" result: -1 as a pointer.
+        return reinterpret_cast<void*>(-1);  // NOLINT(performance-no-int-to-ptr)
     }
     // glibc keeps its own cancellation signal out of any mask.
     sigset_t blocked;

@@ -68,7 +68,9 @@ void MThread::Cancel()
 
 int MThread::Kill(int* err)
 {
-    pthread_setcanceltype(PTHREAD_CANCEL_ASYNCHRONOUS, nullptr);
+    // Kill's documented effect on the caller; the library's own locked spans
+    // hold cancellation off, so they stay safe under it.
+    pthread_setcanceltype(PTHREAD_CANCEL_ASYNCHRONOUS, nullptr);  // NOLINT(cert-pos47-c,concurrency-thread-canceltype-asynchronous)
     pthread_setcancelstate(PTHREAD_CANCEL_ENABLE, nullptr);
     const int result = tessaline::requestCancel(*this);
     StoreLastError(result);

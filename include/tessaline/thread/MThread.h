@@ -140,7 +140,6 @@ public:
     int m_held;
 };
 
-
 // Abstract condition variable interface.
 class TESSALINE_API MCondVar_ : public MThreadError {
 public:
@@ -233,11 +232,12 @@ public:
 class TESSALINE_API MSemaphore : public MSemaphore_ {
 public:
     // Calls Init(count) if count is above 0.
-    MSemaphore(long count, int shared);
+    MSemaphore(long count, int shared) noexcept;
 
     // Makes the platform semaphore with `count`, limited to 32767. A count
-    // below 0 is refused by the platform (-1, EINVAL). Init on a semaphore
-    // that already exists destroys it first: no thread may be waiting on it.
+    // below 0 is refused: -1 with EINVAL, and no platform object. Init on a
+    // semaphore that already exists destroys it first: no thread may be
+    // waiting on it.
     int Init(long count) override;
 
     // Takes one count, waiting as long as it takes; a signal handler running
@@ -464,8 +464,10 @@ public:
 
     // Cancels like Cancel, after setting the *caller's* cancellation to
     // enabled and asynchronous (not restored). It never sends SIGKILL: on
-    // Linux that signal ends the whole process, not one thread. Returns the status of the cancel request; `err`, if given,
-    // receives its code. Without a thread: -1 with ESRCH, silently.
+    // Linux that signal ends the whole process, not one thread. Returns the
+    // status of the cancel request; `err`, if given, receives its code.
+    // Without a thread: -1 with ESRCH, silently. m_cancelled is not set here
+    // but by the thread as it goes out through CancelThread.
     int Kill(int* err) override;
 
     // Waits for the thread and joins it. timeout in milliseconds, of the
@@ -476,8 +478,9 @@ public:
     // it was being joined); -5 when the time ran out (ETIMEDOUT in
     // m_lastError; the thread runs on and Wait can be called again); 3 if
     // the thread is detached; -1 if there is no thread to wait for or a
-    // platform call failed. Each pass of the wait starts the full timeout
-    // again, so a spurious wake-up extends it. `err` has no effect.
+    // platform call failed (EINVAL, with a line, if another Wait is joining
+    // the thread at the same time). Each pass of the wait starts the full
+    // timeout again, so a spurious wake-up extends it. `err` has no effect.
     int Wait(int** retval, int* err, long timeout) override;
 
     // For the routine, on its own object. A cancellation point. Returns
