@@ -13,5 +13,8 @@
 #include "tessaline/util/rvString.h"
 #include "tessaline/util/rvTime.h"
 #include "tessaline/util/HashToken.h"
+#include "tessaline/files/rvFilename.h"
+#include "tessaline/files/rvPath.h"
+#include "tessaline/files/rvSharedLib.h"
 
 #endif
