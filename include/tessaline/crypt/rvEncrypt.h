@@ -2,8 +2,9 @@
  * @file
  * @brief Reversible encryption of byte strings to printable text.
  *
- * The text forms sit on the Twofish engine of twofish.h in ECB mode. There is no integrity protection: a wrong
- * key or altered digits decrypt to other bytes, returned as a success.
+ * The text forms sit on the Twofish engine of twofish.h in ECB mode. There
+ * is no integrity protection: a wrong key or altered digits decrypt to other
+ * bytes, returned as a success.
  *
  * Forms of text:
  * - hexadecimal text: the cipher bytes of the record, each complemented and
@@ -79,8 +80,9 @@ TESSALINE_API int rvEncrypt(unsigned char* data, unsigned long length, char* out
 ///    characters and a NUL are stored and *length is left alone. A capacity
 ///    of 0 counts as 1: out[0] holds the NUL.
 ///
-/// Returns 1 on success (with no check that a wrong key was used), 0 for a null text, out or length, a failed allocation or a
-/// capacity under 37 for chained text.
+/// Returns 1 on success (with no check that a wrong key was used), 0 for a
+/// null text, out or length, a failed allocation or a capacity under 37 for
+/// chained text.
 TESSALINE_API int rvDecrypt(char* text, unsigned char* out, unsigned long* length,
                             unsigned int* wasPlain);
 
