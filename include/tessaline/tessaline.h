@@ -10,5 +10,6 @@
 
 #include "tessaline/util/export.h"
 #include "tessaline/thread/MThread.h"
+#include "tessaline/config/rvConfig.h"
 
 #endif

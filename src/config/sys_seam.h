@@ -1,0 +1,21 @@
+// Test seam of the configuration store's system calls: a test can make any
+// of them fail with a chosen errno, without running it. Not installed.
+#ifndef TESSALINE_SRC_CONFIG_SYS_SEAM_H
+#define TESSALINE_SRC_CONFIG_SYS_SEAM_H
+
+#include "tessaline/util/export.h"
+
+namespace tessaline::config::testing {
+
+enum class SysCall { Open, Write, Sync, Close, Rename, Unlink };
+
+// Asked before each call; `path` is the file the call concerns (for
+// Rename, its source). A nonzero result is the errno with which the call
+// fails. Null restores the real calls.
+typedef int (*FaultHook)(SysCall call, const char* path);
+
+TESSALINE_API void SetFaultHook(FaultHook hook);
+
+}  // namespace tessaline::config::testing
+
+#endif
