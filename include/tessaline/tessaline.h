@@ -10,6 +10,9 @@
 
 #include "tessaline/util/export.h"
 #include "tessaline/thread/MThread.h"
+#include "tessaline/util/rvString.h"
+#include "tessaline/util/rvTime.h"
+#include "tessaline/util/HashToken.h"
 #include "tessaline/config/rvConfig.h"
 
 #endif

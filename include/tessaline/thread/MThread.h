@@ -56,7 +56,7 @@ public:
 // Abstract mutex interface.
 class TESSALINE_API MMutex_ : public MThreadError {
 public:
-    enum MutexType {
+    enum MutexType : int {
         MutexPlain = 0,     // straight to the platform mutex
         MutexChecked = 1,   // refuses (status 2) while held, never queues
         MutexRecursive = 2  // the holder re-enters and counts

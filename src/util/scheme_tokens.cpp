@@ -1,0 +1,11 @@
+#include "util/scheme_tokens.h"
+
+namespace tessaline {
+
+_tokenHash g_schemeTokens[kSchemeTokenLast + 1] = {
+    {"file", kSchemeFile},
+    {"ftp", kSchemeFtp},
+    {"http", kSchemeHttp},
+};
+
+}  // namespace tessaline
