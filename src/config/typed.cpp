@@ -4,9 +4,8 @@
 #include <climits>
 #include <cstdio>
 #include <cstdlib>
-#include <strings.h>
-
 #include "tessaline/config/rvConfig.h"
+#include "tessaline/util/rvString.h"
 
 namespace {
 
@@ -69,10 +68,10 @@ unsigned int rvConfig::GetBool(const char* key, unsigned int def, const char* se
         return def;
     }
     const char* text = value.c_str();
-    if (strcasecmp(text, "false") == 0 || strcasecmp(text, "0") == 0) {
+    if (_stricmp(text, "false") == 0 || _stricmp(text, "0") == 0) {
         return 0;
     }
-    if (strcasecmp(text, "true") == 0 || strcasecmp(text, "1") == 0) {
+    if (_stricmp(text, "true") == 0 || _stricmp(text, "1") == 0) {
         return 1;
     }
     return def;
