@@ -88,7 +88,8 @@ unsigned int rvConfig::PutValue(const char* key, double value, const char* secti
 {
     char text[kNumberBufferSize];
     if (std::snprintf(text, sizeof text, "%f", value) >= kNumberBufferSize) {
-        std::snprintf(text, sizeof text, "%e", value);
+        // At most 24 characters, and strtod gives the same double back.
+        std::snprintf(text, sizeof text, "%.17g", value);
     }
     return _PutValue(cfgStr(key), cfgStr(text), cfgStr(section));
 }

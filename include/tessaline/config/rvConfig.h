@@ -266,9 +266,10 @@ public:
     virtual unsigned int PutValue(const char* key, int value, const char* section);
     // Stores the text exactly as given, blanks included.
     virtual unsigned int PutValue(const char* key, const char* value, const char* section);
-    // Stores "%f" (six decimals). A value whose text would not fit 31
-    // characters (magnitude of about 1e24 and above, infinities excluded)
-    // is stored in "%e" form instead, which always fits.
+    // Stores "%f" (six decimals). A value whose "%f" text would not fit
+    // the 31 characters of the classic buffer (magnitude of about 1e23 and
+    // above) is stored as "%.17g" instead, which fits and reads back as the
+    // same double.
     virtual unsigned int PutValue(const char* key, double value, const char* section);
     // Store by reference: no characters are copied.
     virtual unsigned int PutValue(const __gnu_cxx::crope& key, const __gnu_cxx::crope& value,
