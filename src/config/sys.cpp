@@ -48,6 +48,16 @@ FILE* sys::OpenStream(const char* name, const char* mode)
     return std::fopen(name, mode);
 }
 
+bool sys::Exists(const char* path)
+{
+    return !injectedFault(SysCall::Exists, path) && access(path, F_OK) == 0;
+}
+
+bool sys::Writable(const char* path)
+{
+    return !injectedFault(SysCall::Writable, path) && access(path, W_OK) == 0;
+}
+
 bool sys::Write(FILE* stream, const char* text, std::size_t length, const char* name)
 {
     if (injectedFault(SysCall::Write, name)) {
@@ -72,24 +82,19 @@ bool sys::CloseSynced(FILE* stream, const char* name)
     return good;
 }
 
-bool sys::SyncDirectoryOf(const char* path)
+void sys::SyncDirectory(const char* path)
 {
     const char* slash = std::strrchr(path, '/');
     const std::string directory = slash == nullptr ? std::string(".")
                                   : slash == path ? std::string("/")
                                                   : std::string(path, slash - path);
-    if (injectedFault(SysCall::Sync, directory.c_str())) {
-        return false;
-    }
-    const int fd = open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    if (fd < 0) {
-        return false;
-    }
-    const bool good = fsync(fd) == 0;
     const int saved = errno;
-    close(fd);
+    const int fd = open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (fd >= 0) {
+        fsync(fd);
+        close(fd);
+    }
     errno = saved;
-    return good;
 }
 
 int sys::Rename(const char* from, const char* to)

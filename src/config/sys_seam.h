@@ -7,7 +7,7 @@
 
 namespace tessaline::config::testing {
 
-enum class SysCall { Open, Write, Sync, Close, Rename, Unlink };
+enum class SysCall { Open, Exists, Writable, Write, Sync, Close, Rename, Unlink };
 
 // Asked before each call; `path` is the file the call concerns (for
 // Rename, its source). A nonzero result is the errno with which the call
