@@ -182,6 +182,16 @@ public:
     // Replaces the content of the object by the file: Open, the reading
     // pass, Close(0), all under the class lock. 1 if the file could be
     // opened, whatever it held; 0 if not, and then nothing has changed.
+    //
+    // Lines are trimmed; blank lines and comments ('#', ';', '/') are
+    // skipped; "[name]" selects a section (created if new); "key = value"
+    // stores into it, the first of two values for one key winning. Keys
+    // above the first section line go to DefaultSection(). A value in
+    // double quotes keeps its blanks. A line of more than 4094 bytes is
+    // read as pieces of 4094, each a line of its own. A section line made
+    // only of brackets ("[]", as the writer writes a section with the empty
+    // name) selects the section with the empty name. Afterwards the current
+    // section is the default section, which always exists.
     virtual unsigned int Load(const char* name, OpenMode mode);
 
     // Closes the stream if open, then Flush(0) if bFlush is nonzero and the
@@ -190,8 +200,41 @@ public:
 
     // Writes the tables into the file if the object is modified, then
     // empties the object if bClear is nonzero. 1 on success and when there
-    // was nothing to write, 0 if the file was not replaced (bClear is then
-    // ignored).
+    // was nothing to write, 0 if the file was not replaced as asked (bClear
+    // is then ignored and IsModified() stays 1).
+    //
+    // The old file's comments, blank lines and key lines stay where they
+    // are, with the table's values; removed keys and emptied sections go;
+    // new keys end their section and new sections come last, in table
+    // order; one identification line closes the file. The merged text goes
+    // to a temporary file beside the old one ("app.new" for "app.ini"),
+    // which then replaces it by rename. With CreateBackups(1) the old file
+    // becomes "app.bak", else it is unlinked first. Refuses (0, nothing
+    // touched) in OpenRead mode, or when the file exists but is not
+    // writable or cannot be opened.
+    //
+    // No data is lost:
+    // - Every write to the temporary file is checked, and the file is
+    //   flushed and fsync'ed before anything is renamed. If any of that
+    //   fails (a full disk), the temporary file is removed, the old file is
+    //   left byte for byte, and the result is 0 without a message.
+    // - The directory is synced after the temporary file is complete and
+    //   after the final rename (best effort: not every file system can).
+    //   A crash between the removal of the old name and the final rename
+    //   leaves the new text complete in the temporary file.
+    // - Side-file names never equal the file's own name: where replacing
+    //   the extension would give that name ("app.new", "app.bak"), the
+    //   extension is appended ("app.new.new", "app.bak.bak").
+    // - If the final rename fails with backups off, the old file is already
+    //   gone and the temporary file holds the only copy on disk: it is kept
+    //   under its name. With backups on, the old text is in the backup and
+    //   the temporary file is removed.
+    // The three failures of the replacement print one line each on stderr
+    // (a failed backup rename, a failed unlink, a failed final rename), with
+    // strerror(errno) and errno.
+    //
+    // Holds the class lock while it writes. Ends any enumeration; the
+    // current section is left at the last section the pass selected.
     virtual unsigned int Flush(unsigned int bClear);
 
     // Empties the object: no sections (bucket counts stay), IsValid() and
