@@ -13,6 +13,9 @@
 #include "tessaline/util/rvString.h"
 #include "tessaline/util/rvTime.h"
 #include "tessaline/util/HashToken.h"
+#include "tessaline/files/rvFilename.h"
+#include "tessaline/files/rvPath.h"
+#include "tessaline/files/rvSharedLib.h"
 #include "tessaline/config/rvConfig.h"
 
 #endif
