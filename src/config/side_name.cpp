@@ -1,17 +1,14 @@
-// Side-file names.
-#include <cstring>
-
+// Side-file names, formed through rvFilename.
 #include "config/side_name.h"
+#include "tessaline/files/rvFilename.h"
 
 std::string tessaline::config::SideFileName(const char* configName, const char* ext)
 {
-    const char* slash = std::strrchr(configName, '/');
-    const char* file = slash == nullptr ? configName : slash + 1;
-    const char* dot = std::strrchr(file, '.');
-    std::string name = dot == nullptr ? std::string(configName) : std::string(configName, dot - configName);
-    name.append(".").append(ext);
-    if (name == configName) {
-        name.assign(configName).append(".").append(ext);
+    rvFilename name(configName, 0);
+    name.Ext(ext);
+    std::string sideName(static_cast<const char*>(name));
+    if (sideName == configName) {
+        sideName.assign(configName).append(".").append(ext);
     }
-    return name;
+    return sideName;
 }
