@@ -3,10 +3,13 @@
 #include <cstring>
 #include <utility>
 
+#include "config/borrowed_name.h"
 #include "config/class_lock.h"
+#include "config/lookup.h"
 #include "tessaline/config/rvConfig.h"
 #include "util/load_time.h"
 
+using tessaline::config::BorrowedName;
 using tessaline::config::ScopedClassLock;
 
 const char* rvConfig::m_szCommentChars = "#;/";
@@ -143,21 +146,27 @@ unsigned int rvConfig::IsValid()
     return m_nItems;
 }
 
-unsigned int rvConfig::_GetValue(cfgStr key, cfgStr* value, cfgStr section)
+unsigned int tessaline::config::FindValue(rvConfig& config, const rvConfig::cfgStr& key, rvConfig::cfgStr* value,
+                                         const rvConfig::cfgStr& section)
 {
     ScopedClassLock lock;
-    const cfgStr& name = section.empty() ? m_strSection : section;
-    const SectionTable::iterator found = m_sections.find(name);
-    if (found == m_sections.end()) {
+    const rvConfig::cfgStr& name = section.empty() ? config.m_strSection : section;
+    const rvConfig::SectionTable::iterator found = config.m_sections.find(name);
+    if (found == config.m_sections.end()) {
         return 0;
     }
-    const KeyTable& keys = found->second;
-    const KeyTable::const_iterator entry = keys.find(key);
+    const rvConfig::KeyTable& keys = found->second;
+    const rvConfig::KeyTable::const_iterator entry = keys.find(key);
     if (entry == keys.end()) {
         return 0;
     }
     *value = entry->second;
     return 1;
+}
+
+unsigned int rvConfig::_GetValue(cfgStr key, cfgStr* value, cfgStr section)
+{
+    return tessaline::config::FindValue(*this, key, value, section);
 }
 
 unsigned int rvConfig::_PutValue(cfgStr key, cfgStr value, cfgStr section)
@@ -178,7 +187,7 @@ unsigned int rvConfig::_PutValue(cfgStr key, cfgStr value, cfgStr section)
 const char* rvConfig::GetValue(const char* key, const char* def, const char* section)
 {
     cfgStr value;
-    if (_GetValue(cfgStr(key), &value, cfgStr(section)) == 0) {
+    if (tessaline::config::FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) == 0) {
         return def;
     }
     m_strValue = std::move(value);

@@ -1,7 +1,9 @@
 // Enumeration, counts and removal.
+#include "config/borrowed_name.h"
 #include "config/class_lock.h"
 #include "tessaline/config/rvConfig.h"
 
+using tessaline::config::BorrowedName;
 using tessaline::config::ScopedClassLock;
 
 const char* rvConfig::EnumSections(unsigned int first)
@@ -22,7 +24,7 @@ const char* rvConfig::EnumTokens(const char* section, unsigned int first)
     if (first != 0) {
         m_bTokenStart = 1;
     }
-    const SectionTable::iterator found = m_sections.find(cfgStr(section));
+    const SectionTable::iterator found = m_sections.find(BorrowedName(section));
     if (found == m_sections.end()) {
         return nullptr;
     }
@@ -42,7 +44,7 @@ const char* rvConfig::EnumTokens(const char* section, unsigned int first)
 
 unsigned int rvConfig::TokenCnt(const char* section)
 {
-    const SectionTable::const_iterator found = m_sections.find(cfgStr(section));
+    const SectionTable::const_iterator found = m_sections.find(BorrowedName(section));
     return found == m_sections.end() ? 0 : static_cast<unsigned int>(found->second.size());
 }
 
@@ -54,9 +56,9 @@ unsigned int rvConfig::SectionCnt()
 void rvConfig::RemoveKey(const char* section, const char* key)
 {
     ScopedClassLock lock;
-    const SectionTable::iterator found = m_sections.find(cfgStr(section));
+    const SectionTable::iterator found = m_sections.find(BorrowedName(section));
     if (found != m_sections.end()) {
-        found->second.erase(cfgStr(key));
+        found->second.erase(BorrowedName(key));
     }
     IsModified(1);
 }
@@ -64,6 +66,6 @@ void rvConfig::RemoveKey(const char* section, const char* key)
 void rvConfig::RemoveSection(const char* section)
 {
     ScopedClassLock lock;
-    m_sections.erase(cfgStr(section));
+    m_sections.erase(BorrowedName(section));
     IsModified(1);
 }

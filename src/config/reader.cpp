@@ -14,6 +14,12 @@ namespace {
 
 constexpr int kOpenAttempts = 3;
 
+// The trim set " \t\n\r", tested without a call: Clean runs on every line.
+bool isTrimmed(char c)
+{
+    return c == ' ' || c == '\t' || c == '\n' || c == '\r';
+}
+
 void pauseOneSecond()
 {
     timespec remaining = {1, 0};
@@ -218,13 +224,15 @@ unsigned int rvConfig::Serialize(unsigned int bWrite)
 
 char* rvConfig::Clean(char* text)
 {
-    static const char kTrim[] = " \t\n\r";
     if (text == nullptr || *text == '\0') {
         return text;
     }
-    char* start = text + std::strspn(text, kTrim);
+    char* start = text;
+    while (isTrimmed(*start)) {
+        ++start;
+    }
     char* end = start + std::strlen(start);
-    while (end > start && std::strchr(kTrim, end[-1]) != nullptr) {
+    while (end > start && isTrimmed(end[-1])) {
         *--end = '\0';
     }
     return start;

@@ -4,8 +4,13 @@
 #include <climits>
 #include <cstdio>
 #include <cstdlib>
+#include "config/borrowed_name.h"
+#include "config/lookup.h"
 #include "tessaline/config/rvConfig.h"
 #include "tessaline/util/rvString.h"
+
+using tessaline::config::BorrowedName;
+using tessaline::config::FindValue;
 
 namespace {
 
@@ -17,7 +22,7 @@ constexpr int kNumberBufferSize = 32;
 int rvConfig::GetValue(const char* key, int def, const char* section)
 {
     cfgStr value;
-    if (_GetValue(cfgStr(key), &value, cfgStr(section)) == 0) {
+    if (FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) == 0) {
         return def;
     }
     // long is 64 bits here; clamp to what a 32-bit strtol gives.
@@ -34,7 +39,7 @@ int rvConfig::GetValue(const char* key, int def, const char* section)
 double rvConfig::GetValue(const char* key, double def, const char* section)
 {
     cfgStr value;
-    if (_GetValue(cfgStr(key), &value, cfgStr(section)) == 0) {
+    if (FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) == 0) {
         return def;
     }
     return std::strtod(value.c_str(), nullptr);
@@ -44,7 +49,7 @@ void rvConfig::GetValue(__gnu_cxx::crope& out, const __gnu_cxx::crope& key, cons
                         const __gnu_cxx::crope& section)
 {
     cfgStr value;
-    if (_GetValue(cfgStr(key), &value, cfgStr(section)) != 0) {
+    if (FindValue(*this, cfgStr(key), &value, cfgStr(section)) != 0) {
         out = value;
     } else {
         out = def;
@@ -54,7 +59,7 @@ void rvConfig::GetValue(__gnu_cxx::crope& out, const __gnu_cxx::crope& key, cons
 void rvConfig::GetValue(__gnu_cxx::crope& out, const char* key, const char* def, const char* section)
 {
     cfgStr value;
-    if (_GetValue(cfgStr(key), &value, cfgStr(section)) != 0) {
+    if (FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) != 0) {
         out = value;
     } else {
         out = cfgStr(def);
@@ -64,7 +69,7 @@ void rvConfig::GetValue(__gnu_cxx::crope& out, const char* key, const char* def,
 unsigned int rvConfig::GetBool(const char* key, unsigned int def, const char* section)
 {
     cfgStr value;
-    if (_GetValue(cfgStr(key), &value, cfgStr(section)) == 0) {
+    if (FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) == 0) {
         return def;
     }
     const char* text = value.c_str();
