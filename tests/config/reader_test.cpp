@@ -171,31 +171,22 @@ TEST(RvConfigReader, LongLinesArePieces)
 TEST(RvConfigReader, OpenModes)
 {
     TempDir dir;
-    {
-        rvConfig config(dir.Path("missing.ini").c_str(), rvConfig::OpenUpdate);
-        EXPECT_TRUE(dir.Exists("missing.ini"));
-        EXPECT_EQ(config.IsValid(), 0u);
-        EXPECT_EQ(config.SectionCnt(), 1u);
-        EXPECT_EQ(config.Mode(), rvConfig::OpenUpdate);
-    }
-    {
-        const std::string path = dir.Write("kept.ini", "k = v\n");
-        rvConfig config(path.c_str(), rvConfig::OpenUpdate);
-        EXPECT_STREQ(lookup(config, "k", ""), "v");
-        EXPECT_EQ(dir.Read("kept.ini"), "k = v\n");
-    }
-    {
-        const std::string path = dir.Write("emptied.ini", "k = v\n");
-        rvConfig config(path.c_str(), rvConfig::OpenWrite);
-        EXPECT_EQ(config.IsValid(), 0u);
-        EXPECT_EQ(dir.Read("emptied.ini"), "");
-    }
-    {
-        // A directory opens for reading and yields nothing.
-        rvConfig config(dir.Path("").c_str(), rvConfig::OpenRead);
-        EXPECT_EQ(config.IsValid(), 0u);
-        EXPECT_EQ(config.SectionCnt(), 1u);
-    }
+    rvConfig created(dir.Path("missing.ini").c_str(), rvConfig::OpenUpdate);
+    EXPECT_TRUE(dir.Exists("missing.ini"));
+    EXPECT_EQ(created.IsValid(), 0u);
+    EXPECT_EQ(created.Mode(), rvConfig::OpenUpdate);
+
+    rvConfig kept(dir.Write("kept.ini", "k = v\n").c_str(), rvConfig::OpenUpdate);
+    EXPECT_STREQ(lookup(kept, "k", ""), "v");
+    EXPECT_EQ(dir.Read("kept.ini"), "k = v\n");
+
+    rvConfig emptied(dir.Write("emptied.ini", "k = v\n").c_str(), rvConfig::OpenWrite);
+    EXPECT_EQ(emptied.IsValid(), 0u);
+    EXPECT_EQ(dir.Read("emptied.ini"), "");
+
+    rvConfig directory(dir.Path("").c_str(), rvConfig::OpenRead);  // opens, yields nothing
+    EXPECT_EQ(directory.IsValid(), 0u);
+    EXPECT_EQ(directory.SectionCnt(), 1u);
 }
 
 TEST(RvConfigReader, OpenOwnsOneCloseOnExecStream)
@@ -249,19 +240,6 @@ TEST(RvConfigReader, BadInputIsReadWithoutHarm)
     EXPECT_STREQ(lookup(config, "c", "s"), "4");
 }
 
-TEST(RvConfigReader, CleanTrimsInPlace)
-{
-    rvConfig config;
-    char padded[] = " \t value \r\n";
-    EXPECT_STREQ(config.Clean(padded), "value");
-    EXPECT_STREQ(padded, " \t value");
-    char blank[] = " \t\r\n";
-    EXPECT_STREQ(config.Clean(blank), "");
-    EXPECT_STREQ(blank, " \t\r\n");
-    char empty[] = "";
-    EXPECT_EQ(config.Clean(empty), empty);
-}
-
 // The only test that waits: three tries one second apart.
 TEST(RvConfigReader, FailedLoadKeepsEverything)
 {
@@ -283,7 +261,7 @@ TEST(RvConfigReader, FailedLoadKeepsEverything)
     EXPECT_STREQ(config.ConfigName(), "before.ini");
     EXPECT_EQ(config.Mode(), rvConfig::OpenUpdate);
     EXPECT_EQ(config.m_pFile, nullptr);
-    // Unknown modes open nothing either; a null name fails without waiting.
+    // A null name fails without waiting.
     EXPECT_EQ(config.Open(nullptr, rvConfig::OpenRead), nullptr);
 }
 

@@ -6,7 +6,6 @@
 #include <cstdlib>
 #include <fstream>
 #include <iterator>
-#include <sstream>
 #include <string>
 
 #include <ftw.h>
@@ -16,22 +15,17 @@ namespace tessaline::test {
 
 class TempDir {
 public:
-    TempDir()
-    {
-        char pattern[] = "/tmp/tessaline-config-XXXXXX";
-        m_path = mkdtemp(pattern);
-    }
-
+    TempDir() : m_path("/tmp/tessaline-config-XXXXXX") { mkdtemp(&m_path[0]); }
     ~TempDir()
     {
-        nftw(m_path.c_str(), [](const char* path, const struct stat*, int, struct FTW*) { return remove(path); },
-             16, FTW_DEPTH | FTW_PHYS);
+        nftw(m_path.c_str(), [](const char* path, const struct stat*, int, FTW*) { return remove(path); }, 16,
+             FTW_DEPTH | FTW_PHYS);
     }
-
     TempDir(const TempDir&) = delete;
     TempDir& operator=(const TempDir&) = delete;
 
     std::string Path(const std::string& name) const { return m_path + "/" + name; }
+    bool Exists(const std::string& name) const { return access(Path(name).c_str(), F_OK) == 0; }
 
     std::string Write(const std::string& name, const std::string& content) const
     {
@@ -44,8 +38,6 @@ public:
         std::ifstream in(Path(name), std::ios::binary);
         return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
     }
-
-    bool Exists(const std::string& name) const { return access(Path(name).c_str(), F_OK) == 0; }
 
 private:
     std::string m_path;
