@@ -282,7 +282,7 @@ unsigned int tessaline::config::WritePass(rvConfig& config)
 unsigned int rvConfig::Flush(unsigned int bClear)
 {
     if (IsModified() != 0) {
-        if (m_mode == OpenRead) {
+        if (m_mode == OpenRead || m_szConfigName[0] == '\0') {
             return 0;
         }
         if (sys::Exists(m_szConfigName)) {

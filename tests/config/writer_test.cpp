@@ -220,6 +220,10 @@ TEST(RvConfigWriter, RefusalsLeaveEverything)
 {
     TempDir dir;
     const std::string path = dir.Write("app.ini", "k = 1\n");
+    rvConfig unnamed;
+    unnamed.Mode(rvConfig::OpenUpdate);
+    unnamed.PutValue("k", "2", "");
+    EXPECT_EQ(unnamed.Flush(1), 0u);
     rvConfig config(path.c_str(), rvConfig::OpenRead);
     config.PutValue("k", "2", "");
     EXPECT_EQ(config.Flush(1), 0u);

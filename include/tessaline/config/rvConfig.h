@@ -210,8 +210,8 @@ public:
     // to a temporary file beside the old one ("app.new" for "app.ini"),
     // which then replaces it by rename. With CreateBackups(1) the old file
     // becomes "app.bak", else it is unlinked first. Refuses (0, nothing
-    // touched) in OpenRead mode, or when the file exists but is not
-    // writable or cannot be opened.
+    // touched) in OpenRead mode, without a ConfigName(), or when the file
+    // exists but is not writable or cannot be opened.
     //
     // No data is lost:
     // - Every write to the temporary file is checked, and the file is
