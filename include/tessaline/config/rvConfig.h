@@ -34,7 +34,6 @@
 #include <cstdio>
 #include <cstring>
 #include <strings.h>
-#include <utility>
 
 // The extension hash containers announce themselves as deprecated unless
 // this macro is set; hosts build with warnings as errors, so permit them here
