@@ -9,6 +9,11 @@
 #define TESSALINE_TESSALINE_H
 
 #include "tessaline/util/export.h"
+#include "tessaline/crypt/twofish.h"
+#include "tessaline/crypt/rvEncrypt.h"
+#include "tessaline/files/rvCopy.h"
+#include "tessaline/files/rvDirIterator.h"
+#include "tessaline/files/rvFileApi.h"
 #include "tessaline/thread/MThread.h"
 #include "tessaline/util/rvString.h"
 #include "tessaline/util/rvTime.h"

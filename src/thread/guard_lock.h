@@ -1,5 +1,4 @@
-// Scoped ownership of a raw pthread mutex for the library's own short
-// critical sections.
+// Scoped helpers for the library's own short critical sections.
 #ifndef TESSALINE_SRC_THREAD_GUARD_LOCK_H
 #define TESSALINE_SRC_THREAD_GUARD_LOCK_H
 
@@ -7,6 +6,7 @@
 
 namespace tessaline {
 
+// Holds a raw pthread mutex for one scope.
 class GuardLock {
 public:
     explicit GuardLock(pthread_mutex_t& mutex) : m_mutex(mutex) { pthread_mutex_lock(&m_mutex); }
@@ -16,6 +16,21 @@ public:
 
 private:
     pthread_mutex_t& m_mutex;
+};
+
+// Keeps the calling thread from being cancelled for one scope. A thread that
+// a host has made asynchronously cancellable could otherwise die inside a
+// GuardLock and leave the lock held; a pending request is acted on when the
+// old state returns, after the lock is gone (declare this before the lock).
+class NoCancelScope {
+public:
+    NoCancelScope() { pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &m_oldState); }
+    ~NoCancelScope() { pthread_setcancelstate(m_oldState, &m_oldState); }
+    NoCancelScope(const NoCancelScope&) = delete;
+    NoCancelScope& operator=(const NoCancelScope&) = delete;
+
+private:
+    int m_oldState = PTHREAD_CANCEL_ENABLE;
 };
 
 }  // namespace tessaline

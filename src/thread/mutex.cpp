@@ -3,9 +3,14 @@
 #include <cerrno>
 
 #include "thread/guard_lock.h"
+#include "thread/mutex_record.h"
+#include "thread/relaxed.h"
 #include "tessaline/thread/MThread.h"
 
 using tessaline::GuardLock;
+using tessaline::isTracked;
+using tessaline::loadRelaxed;
+using tessaline::MutexRecord;
 
 namespace {
 
@@ -19,9 +24,21 @@ void storeErrno(int* err)
     }
 }
 
-bool isTracked(const MMutex& mutex)
+// Stores a platform result in m_lastError and hands it back. Callers decide
+// on the value they stored, never on a re-read of the shared field, which a
+// concurrent failure on another thread may already have overwritten.
+int record(MThreadError& object, int result)
 {
-    return mutex.m_type == MMutex_::MutexChecked || mutex.m_type == MMutex_::MutexRecursive;
+    tessaline::storeRelaxed(object.m_lastError, result);
+    return result;
+}
+
+// The tail of Lock, Try and Unlock. Success, by far the common case, needs no
+// call into the exported (and so interposable) reporting function.
+int finish(int result, int* err)
+{
+    storeErrno(err);
+    return result == 0 ? 0 : CHECK_SYSERROR(result);
 }
 
 // Lock and Try of the checked and recursive types.
@@ -43,25 +60,40 @@ int lockTracked(MMutex& mutex, int* err, bool blocking)
         }
     }
     // The only blocking step; m_guard is not held across it.
-    mutex.StoreLastError(blocking ? pthread_mutex_lock(&mutex.m_mutex) : pthread_mutex_trylock(&mutex.m_mutex));
-    if (mutex.LastError() == 0) {
-        GuardLock guard(mutex.m_guard);
-        mutex.m_owner = self;
-        mutex.m_count = 1;
-        mutex.m_held = 1;
-        __atomic_store_n(&mutex.m_locked, 1, __ATOMIC_RELAXED);
+    const int result =
+        record(mutex, blocking ? pthread_mutex_lock(&mutex.m_mutex) : pthread_mutex_trylock(&mutex.m_mutex));
+    if (result == 0) {
+        tessaline::writeRecord(mutex, MutexRecord{self, 1, 1});
     }
-    storeErrno(err);
-    return CHECK_SYSERROR(mutex.LastError());
+    return finish(result, err);
 }
 
 }  // namespace
+
+namespace tessaline {
+
+MutexRecord readRecord(MMutex& mutex)
+{
+    GuardLock guard(mutex.m_guard);
+    return MutexRecord{mutex.m_owner, mutex.m_count, mutex.m_held};
+}
+
+void writeRecord(MMutex& mutex, const MutexRecord& record)
+{
+    GuardLock guard(mutex.m_guard);
+    mutex.m_owner = record.owner;
+    mutex.m_count = record.count;
+    mutex.m_held = record.held;
+    storeRelaxed(mutex.m_locked, record.held);
+}
+
+}  // namespace tessaline
 
 MMutex_::MMutex_() : m_type(MutexPlain), m_locked(0) {}
 
 int MMutex_::Locked() const
 {
-    return __atomic_load_n(&m_locked, __ATOMIC_RELAXED);
+    return loadRelaxed(m_locked);
 }
 
 MMutex::MMutex(MMutex_::MutexType type) : m_attr(), m_mutex(), m_guard(), m_count(0), m_owner(0), m_held(0)
@@ -80,16 +112,14 @@ int MMutex::Create(MMutex_::MutexType type, int* /*err*/)
 {
     StoreLastError(0);
     m_type = type;
-    StoreLastError(pthread_mutexattr_init(&m_attr));
-    CHECK_SYSERROR(m_lastError);
-    StoreLastError(pthread_mutex_init(&m_mutex, &m_attr));
-    CHECK_SYSERROR(m_lastError);
-    StoreLastError(pthread_mutex_init(&m_guard, nullptr));
-    CHECK_SYSERROR(m_lastError);
+    CHECK_SYSERROR(record(*this, pthread_mutexattr_init(&m_attr)));
+    CHECK_SYSERROR(record(*this, pthread_mutex_init(&m_mutex, &m_attr)));
+    const int result = record(*this, pthread_mutex_init(&m_guard, nullptr));
+    CHECK_SYSERROR(result);
     m_count = 0;
     m_owner = 0;
     m_held = 0;
-    return CHECK_SYSERROR(LastError());
+    return CHECK_SYSERROR(result);
 }
 
 MMutex::operator pthread_mutex_t() const
@@ -97,36 +127,39 @@ MMutex::operator pthread_mutex_t() const
     return m_mutex;
 }
 
-
 int MMutex::Lock(int* err)
 {
     if (m_type == MutexPlain) {
-        StoreLastError(pthread_mutex_lock(&m_mutex));
-    } else if (isTracked(*this)) {
+        return finish(record(*this, pthread_mutex_lock(&m_mutex)), err);
+    }
+    if (isTracked(*this)) {
         return lockTracked(*this, err, true);
     }
-    storeErrno(err);
-    return CHECK_SYSERROR(LastError());
+    return finish(loadRelaxed(m_lastError), err);
 }
 
 int MMutex::Try(int* err)
 {
     StoreLastError(0);
     if (m_type == MutexPlain) {
-        StoreLastError(pthread_mutex_trylock(&m_mutex));
-    } else if (isTracked(*this)) {
+        return finish(record(*this, pthread_mutex_trylock(&m_mutex)), err);
+    }
+    if (isTracked(*this)) {
         return lockTracked(*this, err, false);
     }
-    storeErrno(err);
-    return CHECK_SYSERROR(LastError());
+    return finish(0, err);
 }
 
 int MMutex::Unlock(int* err)
 {
     if (m_type == MutexPlain) {
-        StoreLastError(pthread_mutex_unlock(&m_mutex));
-    } else if (isTracked(*this)) {
-        StoreLastError(0);
+        return finish(record(*this, pthread_mutex_unlock(&m_mutex)), err);
+    }
+    if (!isTracked(*this)) {
+        return finish(loadRelaxed(m_lastError), err);
+    }
+    int result = record(*this, 0);
+    {
         GuardLock guard(m_guard);
         if (m_held == 0) {
             StoreLastError(kRefused);
@@ -140,10 +173,9 @@ int MMutex::Unlock(int* err)
         if (--m_count == 0) {
             m_owner = 0;
             m_held = 0;
-            __atomic_store_n(&m_locked, 0, __ATOMIC_RELAXED);
-            StoreLastError(pthread_mutex_unlock(&m_mutex));
+            tessaline::storeRelaxed(m_locked, 0);
+            result = record(*this, pthread_mutex_unlock(&m_mutex));
         }
     }
-    storeErrno(err);
-    return CHECK_SYSERROR(LastError());
+    return finish(result, err);
 }

@@ -1,5 +1,6 @@
 /*
- * Thread objects over POSIX threads.
+ * Thread objects over POSIX threads: mutexes, condition variables,
+ * semaphores, thread keys and threads.
  *
  * Every class here derives from MThreadError and reports in one way: the
  * outcome of the last platform call is kept in m_lastError, a failure that
@@ -9,10 +10,14 @@
  *
  * Status codes:
  *    0  success
- *   -1  a platform call failed (see LastError)
+ *   -1  a platform call failed (see LastError); MThread::Wait: no thread
  *    2  MMutex: a MutexChecked mutex is already held
- *    3  MMutex::Unlock: the tracked mutex is not held
+ *    3  MMutex::Unlock: the tracked mutex is not held;
+ *       MThread::Wait: the thread is detached
  *   -2  MMutex::Unlock: the caller is not the holder
+ *   -4  MThread::Suspend, MThread::Resume: not available on this platform
+ *   -5  MCondVar::Wait, MThread::Wait: the time given ran out
+ *   -6  MThread::Pause: the pause ended because the thread was cancelled
  *
  * Thread safety: every operation may be called from any thread once the
  * object is constructed. m_lastError is shared by all callers of an object:
@@ -23,6 +28,7 @@
 #define TESSALINE_THREAD_MTHREAD_H
 
 #include <pthread.h>
+#include <semaphore.h>
 
 #include "tessaline/util/export.h"
 
@@ -119,6 +125,10 @@ public:
     // held mutex is not detected.
     virtual ~MMutex();
 
+    // A platform mutex can't be copied; neither can this.
+    MMutex(const MMutex&) = delete;
+    MMutex& operator=(const MMutex&) = delete;
+
     // A copy by value of the platform mutex, as the classic interface has it.
     operator pthread_mutex_t() const;
 
@@ -128,6 +138,397 @@ public:
     int m_count;
     unsigned long m_owner;
     int m_held;
+};
+
+// Abstract condition variable interface.
+class TESSALINE_API MCondVar_ : public MThreadError {
+public:
+    MCondVar_();
+    virtual int Create(int* err) = 0;
+    virtual int Wait(MMutex_& mutex, int* err, long timeout) = 0;
+    virtual int Broadcast(int* err) = 0;
+    virtual int Signal(int* err) = 0;
+};
+
+/*
+ * A condition variable that waits on an MMutex, with a timeout in
+ * milliseconds of whole-second grain. Wait has no loop against spurious
+ * wake-ups: callers test their own condition.
+ *
+ * Typical use:
+ *   mutex.Lock(nullptr);
+ *   while (!ready && cond.Wait(mutex, nullptr, 0) == 0) {}
+ *   mutex.Unlock(nullptr);
+ */
+class TESSALINE_API MCondVar : public MCondVar_ {
+public:
+    MCondVar();
+
+    // Initialises the attribute object and the platform condition. Each
+    // step's result goes through CHECK_SYSERROR, so a failed second step
+    // writes its line twice. `err`, if given, receives errno.
+    int Create(int* err) override;
+
+    // Waits until signalled (timeout 0) or until the time runs out. The
+    // caller holds `mutex`, which must be an MMutex (anything else: -1 with
+    // EINVAL). Returns 0 when woken, -5 when the time ran out (ETIMEDOUT in
+    // m_lastError, nothing on stderr), -1 on a platform failure. On 0 and -5
+    // the caller holds the mutex again, and a checked or recursive mutex has
+    // its record back as it entered (holder and count), even if other threads
+    // passed through the mutex meanwhile, so a later Unlock works.
+    //
+    // The deadline is the current wall-clock second plus timeout / 1000 whole
+    // seconds, at least one: 1 to 1999 ms wait at most one second, 2500 ms
+    // between one and two. A negative timeout is an immediate timeout: -5 at
+    // once, the mutex never released. `err` has no effect.
+    //
+    // The wait is a cancellation point. A thread cancelled in it releases the
+    // mutex completely, and a tracked mutex that still records that thread as
+    // holder is recorded free, so it doesn't refuse or wait for a dead thread.
+    int Wait(MMutex_& mutex, int* err, long timeout) override;
+
+    // Wake all waiters, or one. `err` has no effect.
+    int Broadcast(int* err) override;
+    int Signal(int* err) override;
+
+    // Destroys the attribute object, then the condition; results ignored.
+    virtual ~MCondVar();
+
+    MCondVar(const MCondVar&) = delete;
+    MCondVar& operator=(const MCondVar&) = delete;
+
+    // A copy by value of the platform condition, as the classic interface has it.
+    operator pthread_cond_t() const;
+
+    // A clean-up handler for host code: unlocks the pthread_mutex_t given.
+    static void Cleanup(void* mutex);
+
+    pthread_cond_t m_cond;
+    pthread_condattr_t m_attr;
+};
+
+// Abstract counting semaphore interface.
+class TESSALINE_API MSemaphore_ : public MThreadError {
+public:
+    MSemaphore_();
+    virtual int Init(long count) = 0;
+    virtual int Wait() = 0;
+    virtual int Try() = 0;
+    virtual int Signal() = 0;
+    // The current count; this base has none to give and returns -1.
+    virtual long Count();
+};
+
+/*
+ * A counting semaphore of one process (shared 0) or shared between
+ * processes. The semaphore calls report errno, so m_lastError holds an errno
+ * value after a failure.
+ *
+ * A semaphore made with a count of 0 or less has no platform object until
+ * Init. Until then Wait, Try and Signal return -1 with EINVAL (and the
+ * CHECK_SYSERROR line), Count returns -1, and the destructor leaves the
+ * platform alone.
+ */
+class TESSALINE_API MSemaphore : public MSemaphore_ {
+public:
+    // Calls Init(count) if count is above 0.
+    MSemaphore(long count, int shared) noexcept;
+
+    // Makes the platform semaphore with `count`, limited to 32767. A count
+    // below 0 is refused: -1 with EINVAL, and no platform object. Init on a
+    // semaphore that already exists destroys it first: no thread may be
+    // waiting on it.
+    int Init(long count) override;
+
+    // Takes one count, waiting as long as it takes; a signal handler running
+    // in between doesn't end the wait. A cancellation point: a thread
+    // cancelled while it waits takes no count.
+    int Wait() override;
+
+    // Takes one count if there is one. An empty semaphore gives -1 at once
+    // with EAGAIN in m_lastError and writes nothing.
+    int Try() override;
+
+    // Gives one count back.
+    int Signal() override;
+
+    // The current count, or -1 if there is no platform object or the platform
+    // refuses. m_lastError is not touched.
+    long Count() override;
+
+    // m_lastError takes the result of destroying the platform semaphore, if
+    // there is one.
+    virtual ~MSemaphore();
+
+    MSemaphore(const MSemaphore&) = delete;
+    MSemaphore& operator=(const MSemaphore&) = delete;
+
+    // A copy by value of the platform semaphore, as the classic interface has it.
+    operator sem_t() const;
+
+    // A clean-up handler for host code: posts the sem_t given.
+    static void Cleanup(void* sem);
+
+    int m_shared;
+    sem_t m_sem;
+
+private:
+    bool m_bInitialised;
+};
+
+// Abstract thread-specific data interface.
+class TESSALINE_API MThreadKey_ : public MThreadError {
+public:
+    MThreadKey_();
+    virtual int Create(void (*destructor)(), int, int*) = 0;
+    virtual int SetValue(void* value, int* err) = 0;
+    virtual void* GetValue(int* err) = 0;
+};
+
+/*
+ * One key of thread-specific data: each thread sees its own value, null
+ * until it sets one.
+ *
+ * The platform may hand out 0 as a real key; the object keeps a mark of its
+ * own for whether it has a key, so such a key is used and deleted like any
+ * other. The object owns its key and deletes it with itself.
+ */
+class TESSALINE_API MThreadKey : public MThreadKey_ {
+public:
+    MThreadKey();
+
+    // Makes the key. `destructor` (may be null) is handed to the platform,
+    // which calls it at a thread's exit with that thread's non-null value as
+    // its one argument: pass a void (*)(void*) cast to this type. Create on
+    // an object that already has a key deletes that key first. The last two
+    // arguments have no effect.
+    int Create(void (*destructor)(), int, int*) override;
+
+    // Sets the calling thread's value. Without a key: -1 with EINVAL, so a
+    // value never lands under a key that belongs to someone else. `err` has
+    // no effect.
+    int SetValue(void* value, int* err) override;
+
+    // The calling thread's value; null if it set none or there is no key.
+    // m_lastError is not touched; `err` has no effect.
+    void* GetValue(int* err) override;
+
+    // Deletes the key, if there is one. The values' destructors don't run.
+    virtual ~MThreadKey();
+
+    MThreadKey(const MThreadKey&) = delete;
+    MThreadKey& operator=(const MThreadKey&) = delete;
+
+    // The platform key; 0 also when there is none.
+    operator unsigned int() const;
+
+    unsigned int m_key;
+
+private:
+    bool m_bHasKey;
+};
+
+// Abstract thread interface, and the count of thread objects.
+class TESSALINE_API MThread_ : public MThreadError {
+public:
+    // Stored and read back; nothing maps it to a platform priority.
+    enum ThreadPriority : int {
+        PriorityLowest = -2,
+        PriorityLow = -1,
+        PriorityNormal = 0,
+        PriorityHigh = 1,
+        PriorityHighest = 2
+    };
+
+    // Both count the object in m_threadCnt; the destructor counts it out.
+    explicit MThread_(ThreadPriority priority);
+    MThread_(const MThread_& other);
+    MThread_& operator=(const MThread_& other) = default;
+
+    virtual ~MThread_();
+    virtual int Create(void* (*routine)(void*), void* arg, int stackSize, int detached, int, int*) = 0;
+    virtual unsigned long Self() = 0;
+    virtual int Suspend() = 0;
+    virtual int Resume() = 0;
+    virtual int Detach() = 0;
+    virtual void Cancel() = 0;
+    virtual int Kill(int* err) = 0;
+    virtual int Wait(int** retval, int* err, long timeout) = 0;
+    virtual int Cancelled(int* err, int milliseconds) = 0;
+    virtual void Priority(ThreadPriority priority) = 0;
+    virtual ThreadPriority Priority() = 0;
+    virtual bool Exists() = 0;
+
+    // 0: no thread created by this object; 1: a joinable thread was created;
+    // 3: the thread is detached.
+    int m_state;
+    ThreadPriority m_priority;
+
+    // Thread objects alive. Read it with an atomic load if other threads may
+    // be making or destroying objects at the same time.
+    static int m_threadCnt;
+    // 64, for the host; nothing here reads it.
+    static int m_maxThreadCnt;
+};
+
+/*
+ * One thread as an object: Create starts a routine in a new thread, Wait
+ * waits for it with a timeout and joins it, Cancel asks it to stop, and the
+ * routine itself can pause in a way that a Cancel ends (Pause, Cancelled).
+ *
+ * The object must outlive its thread: the thread uses it after the routine
+ * returns, to mark it finished. Wait for a joinable thread before destroying
+ * the object; a detached thread's object must stay until m_finished is 1 and
+ * m_mutex has been taken and released once after that. One object starts
+ * one thread.
+ *
+ * Every created thread runs with all signals blocked but SIGKILL, and with
+ * deferred cancellation: it ends at its next cancellation point (a sleep, a
+ * wait, Pause) or sees the request through Cancelled. A thread that is
+ * cancelled or calls Exit goes out through CancelThread: it is marked
+ * cancelled and finished, and it detaches itself, so Wait then gives 3 (or
+ * -1 once the object has let go of the thread).
+ *
+ * Thread safety: Wait, Detach, Cancel, Kill and Exists may be called from
+ * any thread while the thread runs; they serialise on m_mutex. A Cancel or
+ * Kill must not race the return of a Wait that joins (the identifier may be
+ * stale by then); issue them from the thread that waits, or order them.
+ *
+ * Typical use:
+ *   MThread thread(MThread_::PriorityNormal);
+ *   thread.Create(routine, arg, 0, 0, 0, nullptr);
+ *   if (thread.Wait(nullptr, nullptr, 5000) == -5) { thread.Cancel(); }
+ *   thread.Wait(nullptr, nullptr, -1);
+ */
+class TESSALINE_API MThread : public MThread_ {
+public:
+    // On the calling thread.
+    static unsigned long ThreadID();
+    static void YieldThread();
+    // Ends the calling thread with `value`. A thread started by Create goes
+    // through CancelThread, so it counts as cancelled.
+    [[noreturn]] static void Exit(void* value);
+    // pthread_once on `control` (an int set to 0 beforehand). Returns 0, or
+    // -1 with a line on stderr; a null `control` gives -1 (EINVAL).
+    static int Once(void (*routine)(), int* control);
+    // The start routine of every thread that Create starts.
+    static void* ThreadRoutineWrapper(MThread* thread);
+    // The clean-up handler of a thread that is cancelled or calls Exit.
+    static void CancelThread(void* thread);
+
+    explicit MThread(MThread_::ThreadPriority priority = PriorityNormal);
+    // Copies every value, m_lastError included, but has a mutex and a
+    // condition of its own. The copy doesn't control the thread's wake-ups:
+    // its timed Wait only sees a thread that had finished when it was made.
+    // Once one object has joined the thread, the others' m_thread is stale:
+    // set it to 0 before using or destroying them.
+    MThread(const MThread& other);
+    // Copies m_routine, m_arg, m_cancelled, m_thread, m_attr and m_finished;
+    // m_state, m_priority and m_lastError stay.
+    virtual MThread& operator=(const MThread& other);
+
+    // Detaches a created thread that nobody joined, then frees the mutex and
+    // the condition. A thread adopted through Self is left alone.
+    ~MThread() override;
+
+    // Starts `routine(arg)` in a new thread through ThreadRoutineWrapper.
+    // stackSize 0 is the platform's default; a size the platform refuses
+    // leaves the default too. detached 1 starts it detached and the object
+    // lets go of it at once (m_state 3, m_thread 0): Wait, Exists, Cancel and
+    // Kill then have no thread to act on, while m_finished and m_cancelled
+    // are still kept. Returns 0, or -1 with the platform code in m_lastError
+    // (a line on stderr unless it is EAGAIN); a failure leaves m_state as it
+    // was. On an object that has already started a thread (m_state not 0):
+    // -1 with EBUSY, nothing started. A null routine starts a thread that
+    // ends at once with (void*)-1 and marks the object finished. The last
+    // two arguments have no effect.
+    int Create(void* (*routine)(void*), void* arg, int stackSize, int detached, int, int*) override;
+
+    // The object stands for the calling thread from now on: its identifier
+    // goes into m_thread and comes back.
+    unsigned long Self() override;
+
+    // Not available on this platform: -4, nothing done.
+    int Suspend() override;
+    int Resume() override;
+
+    // Detaches the thread unless it is detached already or there is none.
+    // Returns the status of m_lastError, which a call with nothing to do
+    // leaves as it was. While another thread joins it: -1 with EINVAL.
+    int Detach() override;
+
+    // Asks the thread to stop and marks the object cancelled. The result is
+    // only visible in LastError: ESRCH when the object has no thread to act
+    // on (m_cancelled is still set, for a routine that polls Cancelled).
+    void Cancel() override;
+
+    // Cancels like Cancel, after setting the *caller's* cancellation to
+    // enabled and asynchronous (not restored). It never sends SIGKILL: on
+    // Linux that signal ends the whole process, not one thread. Returns the
+    // status of the cancel request; `err`, if given, receives its code.
+    // Without a thread: -1 with ESRCH, silently. m_cancelled is not set here
+    // but by the thread as it goes out through CancelThread.
+    int Kill(int* err) override;
+
+    // Waits for the thread and joins it. timeout in milliseconds, of the
+    // grain of MCondVar::Wait; 0 waits as long as it takes; -1 joins
+    // straight away; any other negative value is an immediate timeout.
+    // Returns 0 once joined, with the routine's result in *retval if retval
+    // is not null (PTHREAD_CANCELED for a thread ended by cancellation while
+    // it was being joined); -5 when the time ran out (ETIMEDOUT in
+    // m_lastError; the thread runs on and Wait can be called again); 3 if
+    // the thread is detached; -1 if there is no thread to wait for or a
+    // platform call failed (EINVAL, with a line, if another Wait is joining
+    // the thread at the same time). Each pass of the wait starts the full
+    // timeout again, so a spurious wake-up extends it. `err` has no effect.
+    int Wait(int** retval, int* err, long timeout) override;
+
+    // For the routine, on its own object. A cancellation point. Returns
+    // m_cancelled at once if it is set or milliseconds is 0; otherwise
+    // sleeps up to `milliseconds` in slices of at most about six seconds,
+    // ending early once the object is cancelled, and returns m_cancelled.
+    // The end is measured on the 32-bit microsecond tick counter: a pause
+    // that would end past its wrap, and a negative one, end at once. `err`
+    // has no effect.
+    int Cancelled(int* err, int milliseconds) override;
+
+    // Does nothing at all, not even store the value.
+    void Priority(MThread_::ThreadPriority priority) override;
+    // The priority given to the constructor.
+    MThread_::ThreadPriority Priority() override;
+
+    // True if the object has a thread and the platform still knows it. A
+    // thread that has ended but was not joined may still count as existing.
+    bool Exists() override;
+
+    // Cancelled(err, milliseconds): -6 if the thread was cancelled, else 0.
+    // With cancellation disabled in the thread, a Cancel ends the pause after
+    // the current slice.
+    virtual int Pause(int* err, int milliseconds);
+
+    // m_thread.
+    operator unsigned long() const;
+
+    MCondVar* m_cond;
+    MMutex* m_mutex;
+    void* (*m_routine)(void*);
+    void* m_arg;
+    // 1 once the routine has ended in any way.
+    int m_finished;
+    // 1 once Cancel was called or the thread went out through CancelThread.
+    int m_cancelled;
+    pthread_attr_t m_attr;
+    // The platform identifier; 0 when the object has no thread to join or
+    // signal.
+    unsigned long m_thread;
+
+    // The library's own: 1 while a Wait joins the thread, so that nothing
+    // detaches it under the joiner. Guarded by m_mutex.
+    int m_joining;
+
+    // Made when the library loads, with a count of 64; nothing here waits on
+    // it or signals it.
+    static MSemaphore m_thrdSemaphore;
 };
 
 #endif

@@ -1,0 +1,75 @@
+// Shared set-up of the cipher benchmarks: the same key, the same 16 MiB of
+// input, and a cycles-per-byte counter: the thread's CPU time in cycles of
+// the time-stamp counter (the nominal clock), so that time lost to other
+// processes on a busy machine does not count.
+#ifndef TESSALINE_BENCH_CRYPT_CIPHER_BENCH_H
+#define TESSALINE_BENCH_CRYPT_CIPHER_BENCH_H
+
+#include <chrono>
+#include <cstdint>
+#include <ctime>
+#include <vector>
+
+#include <benchmark/benchmark.h>
+#include <x86intrin.h>
+
+namespace cipher_bench {
+
+constexpr std::size_t kEcbBytes = 16u << 20;
+
+inline const uint8_t* Key256()
+{
+    static const uint8_t key[32] = {0x3A, 0x9F, 0x0C, 0x52, 0xE8, 0xB1, 0x47, 0x6D, 0x90, 0xAD, 0x2F,
+                                    0x63, 0xC1, 0xE4, 0x7B, 0x58, 0x01, 0x23, 0x45, 0x67, 0x89, 0xAB,
+                                    0xCD, 0xEF, 0xFE, 0xDC, 0xBA, 0x98, 0x76, 0x54, 0x32, 0x10};
+    return key;
+}
+
+inline std::vector<uint8_t> Input(std::size_t size)
+{
+    std::vector<uint8_t> bytes(size);
+    for (std::size_t i = 0; i < size; ++i)
+        bytes[i] = static_cast<uint8_t>(i * 131 + 7);
+    return bytes;
+}
+
+// Ticks of the time-stamp counter per second, measured once.
+inline double TscHz()
+{
+    static const double hz = [] {
+        const auto start = std::chrono::steady_clock::now();
+        const uint64_t ticks = __rdtsc();
+        while (std::chrono::steady_clock::now() - start < std::chrono::milliseconds(100)) {
+        }
+        const std::chrono::duration<double> elapsed = std::chrono::steady_clock::now() - start;
+        return static_cast<double>(__rdtsc() - ticks) / elapsed.count();
+    }();
+    return hz;
+}
+
+inline double ThreadCpuSeconds()
+{
+    timespec now;
+    clock_gettime(CLOCK_THREAD_CPUTIME_ID, &now);
+    return static_cast<double>(now.tv_sec) + now.tv_nsec * 1e-9;
+}
+
+// Runs `body` once per iteration and reports bytes/s and cycles/byte.
+template <typename Body>
+void MeasureThroughput(benchmark::State& state, std::size_t bytesPerIteration, Body body)
+{
+    const double hz = TscHz();
+    double cpuSeconds = 0;
+    for (auto _ : state) {
+        const double start = ThreadCpuSeconds();
+        body();
+        cpuSeconds += ThreadCpuSeconds() - start;
+    }
+    const double bytes = static_cast<double>(bytesPerIteration) * state.iterations();
+    state.SetBytesProcessed(static_cast<int64_t>(bytes));
+    state.counters["cycles/byte"] = cpuSeconds * hz / bytes;
+}
+
+}  // namespace cipher_bench
+
+#endif

@@ -1,0 +1,269 @@
+// Block encryption and decryption of the engine: ECB and CBC over whole
+// blocks, and the CFB1 bit loop on top of ECB.
+#include <cstring>
+
+#include "crypt/twofish_internal.h"
+
+using namespace tessaline_crypt;
+
+namespace {
+
+constexpr int kBlockBytes = BLOCK_SIZE / 8;
+constexpr int kSubkeyWords = kWhiteningWords + 2 * kRoundSubkeyPairs;
+
+#define TESSALINE_ALWAYS_INLINE inline __attribute__((always_inline))
+
+TESSALINE_ALWAYS_INLINE uint32_t loadBigEndian(const unsigned char* p)
+{
+    uint32_t word;
+    std::memcpy(&word, p, sizeof word);
+    return __builtin_bswap32(word);
+}
+
+TESSALINE_ALWAYS_INLINE void storeBigEndian(unsigned char* p, uint32_t word)
+{
+    word = __builtin_bswap32(word);
+    std::memcpy(p, &word, sizeof word);
+}
+
+// g of a word, byte j of the input (bits 31-8j downwards) indexing table j.
+TESSALINE_ALWAYS_INLINE uint32_t g(const uint32_t* s, uint32_t x)
+{
+    return s[2 * (x >> 24)] ^ s[2 * ((x >> 16) & 0xFF) + 1] ^ s[512 + 2 * ((x >> 8) & 0xFF)] ^
+           s[513 + 2 * (x & 0xFF)];
+}
+
+// g of the second round input, whose bytes are taken in the order 3, 0, 1, 2.
+TESSALINE_ALWAYS_INLINE uint32_t gRotated(const uint32_t* s, uint32_t x)
+{
+    return s[2 * (x & 0xFF)] ^ s[2 * (x >> 24) + 1] ^ s[512 + 2 * ((x >> 16) & 0xFF)] ^
+           s[513 + 2 * ((x >> 8) & 0xFF)];
+}
+
+struct Block {
+    uint32_t w[4];
+};
+
+// One round pair on `Lanes` independent blocks at once: the table reads of
+// one block overlap the dependent chain of another. Both directions take the
+// round subkeys from the end of the array: a key turned for encryption holds
+// them last first.
+template <int Lanes>
+TESSALINE_ALWAYS_INLINE void encryptLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
+{
+    uint32_t x0[Lanes], x1[Lanes], x2[Lanes], x3[Lanes];
+#pragma GCC unroll 4
+    for (int l = 0; l < Lanes; ++l) {
+        x0[l] = b[l].w[0] ^ k[0];
+        x1[l] = b[l].w[1] ^ k[1];
+        x2[l] = b[l].w[2] ^ k[2];
+        x3[l] = b[l].w[3] ^ k[3];
+    }
+    const uint32_t* roundKey = k + kSubkeyWords - 2;
+#pragma GCC unroll 8
+    for (int r = 0; r < rounds; r += 2, roundKey -= 4) {
+#pragma GCC unroll 4
+        for (int l = 0; l < Lanes; ++l) {
+            const uint32_t t0 = g(s, x0[l]);
+            const uint32_t t1 = gRotated(s, x1[l]);
+            x2[l] = rotateRight(x2[l] ^ (t0 + t1 + roundKey[0]), 1);
+            x3[l] = rotateLeft(x3[l], 1) ^ (t0 + 2 * t1 + roundKey[1]);
+        }
+#pragma GCC unroll 4
+        for (int l = 0; l < Lanes; ++l) {
+            const uint32_t t0 = g(s, x2[l]);
+            const uint32_t t1 = gRotated(s, x3[l]);
+            x0[l] = rotateRight(x0[l] ^ (t0 + t1 + roundKey[-2]), 1);
+            x1[l] = rotateLeft(x1[l], 1) ^ (t0 + 2 * t1 + roundKey[-1]);
+        }
+    }
+#pragma GCC unroll 4
+    for (int l = 0; l < Lanes; ++l) {
+        b[l].w[0] = x2[l] ^ k[4];
+        b[l].w[1] = x3[l] ^ k[5];
+        b[l].w[2] = x0[l] ^ k[6];
+        b[l].w[3] = x1[l] ^ k[7];
+    }
+}
+
+template <int Lanes>
+TESSALINE_ALWAYS_INLINE void decryptLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
+{
+    uint32_t x0[Lanes], x1[Lanes], x2[Lanes], x3[Lanes];
+#pragma GCC unroll 4
+    for (int l = 0; l < Lanes; ++l) {
+        x0[l] = b[l].w[0] ^ k[4];
+        x1[l] = b[l].w[1] ^ k[5];
+        x2[l] = b[l].w[2] ^ k[6];
+        x3[l] = b[l].w[3] ^ k[7];
+    }
+    const uint32_t* roundKey = k + kWhiteningWords + 2 * (rounds - 1);
+#pragma GCC unroll 8
+    for (int r = 0; r < rounds; r += 2, roundKey -= 4) {
+#pragma GCC unroll 4
+        for (int l = 0; l < Lanes; ++l) {
+            const uint32_t t0 = g(s, x0[l]);
+            const uint32_t t1 = gRotated(s, x1[l]);
+            x2[l] = rotateLeft(x2[l], 1) ^ (t0 + t1 + roundKey[0]);
+            x3[l] = rotateRight(x3[l] ^ (t0 + 2 * t1 + roundKey[1]), 1);
+        }
+#pragma GCC unroll 4
+        for (int l = 0; l < Lanes; ++l) {
+            const uint32_t t0 = g(s, x2[l]);
+            const uint32_t t1 = gRotated(s, x3[l]);
+            x0[l] = rotateLeft(x0[l], 1) ^ (t0 + t1 + roundKey[-2]);
+            x1[l] = rotateRight(x1[l] ^ (t0 + 2 * t1 + roundKey[-1]), 1);
+        }
+    }
+#pragma GCC unroll 4
+    for (int l = 0; l < Lanes; ++l) {
+        b[l].w[0] = x2[l] ^ k[0];
+        b[l].w[1] = x3[l] ^ k[1];
+        b[l].w[2] = x0[l] ^ k[2];
+        b[l].w[3] = x1[l] ^ k[3];
+    }
+}
+
+TESSALINE_ALWAYS_INLINE Block loadBlock(const unsigned char* p)
+{
+    return Block{{loadBigEndian(p), loadBigEndian(p + 4), loadBigEndian(p + 8), loadBigEndian(p + 12)}};
+}
+
+TESSALINE_ALWAYS_INLINE void storeBlock(unsigned char* p, const Block& b)
+{
+    for (int i = 0; i < 4; ++i)
+        storeBigEndian(p + 4 * i, b.w[i]);
+}
+
+enum class Direction { kEncrypt, kDecrypt };
+
+template <Direction D, int Lanes>
+TESSALINE_ALWAYS_INLINE void cipherLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
+{
+    if (D == Direction::kEncrypt)
+        encryptLanes<Lanes>(s, k, rounds, b);
+    else
+        decryptLanes<Lanes>(s, k, rounds, b);
+}
+
+// Electronic code book: blocks are independent, so they go four at a time.
+template <Direction D>
+TESSALINE_ALWAYS_INLINE void runCodeBook(const uint32_t* s, const uint32_t* k, int rounds, long blocks,
+                                         const unsigned char* in, unsigned char* out)
+{
+    constexpr int kLanes = 4;
+    for (; blocks >= kLanes; blocks -= kLanes, in += kLanes * kBlockBytes, out += kLanes * kBlockBytes) {
+        Block b[kLanes];
+        for (int l = 0; l < kLanes; ++l)
+            b[l] = loadBlock(in + l * kBlockBytes);
+        cipherLanes<D, kLanes>(s, k, rounds, b);
+        for (int l = 0; l < kLanes; ++l)
+            storeBlock(out + l * kBlockBytes, b[l]);
+    }
+    for (; blocks > 0; --blocks, in += kBlockBytes, out += kBlockBytes) {
+        Block b = loadBlock(in);
+        cipherLanes<D, 1>(s, k, rounds, &b);
+        storeBlock(out, b);
+    }
+}
+
+// Cipher block chaining on block words, with the chaining value in `chain`.
+template <Direction D>
+void runChained(const uint32_t* s, const uint32_t* k, int rounds, long blocks, uint32_t* chain,
+                const unsigned char* in, unsigned char* out)
+{
+    for (; blocks > 0; --blocks, in += kBlockBytes, out += kBlockBytes) {
+        Block b = loadBlock(in);
+        if (D == Direction::kEncrypt) {
+            for (int i = 0; i < 4; ++i)
+                b.w[i] ^= chain[i];
+            encryptLanes<1>(s, k, rounds, &b);
+            std::memcpy(chain, b.w, sizeof b.w);
+        } else {
+            const Block cipherWords = b;
+            decryptLanes<1>(s, k, rounds, &b);
+            for (int i = 0; i < 4; ++i)
+                b.w[i] ^= chain[i];
+            std::memcpy(chain, cipherWords.w, sizeof cipherWords.w);
+        }
+        storeBlock(out, b);
+    }
+}
+
+// The one-bit feedback loop: each bit is combined with the top bit of the
+// enciphered feedback register, which then shifts left taking in the
+// cipher-text bit.
+int runCfb1(cipherInstance* cipher, keyInstance* key, const unsigned char* input, int inputLen,
+            unsigned char* out, Direction direction)
+{
+    cipher->mode = MODE_ECB;
+    for (int n = 0; n < inputLen; ++n) {
+        unsigned char keystream[kBlockBytes];
+        blockEncrypt(cipher, key, cipher->IV, BLOCK_SIZE, keystream);
+        const unsigned char mask = static_cast<unsigned char>(0x80 >> (n & 7));
+        const unsigned inBit = (input[n / 8] & mask) ? 1 : 0;
+        const unsigned outBit = inBit ^ (keystream[0] >> 7);
+        out[n / 8] = static_cast<unsigned char>((out[n / 8] & ~mask) | (outBit ? mask : 0));
+        unsigned carry = direction == Direction::kEncrypt ? outBit : inBit;
+        for (int i = kBlockBytes - 1; i >= 0; --i) {
+            const unsigned top = cipher->IV[i] >> 7;
+            cipher->IV[i] = static_cast<unsigned char>((cipher->IV[i] << 1) | carry);
+            carry = top;
+        }
+    }
+    cipher->mode = MODE_CFB1;
+    return inputLen;
+}
+
+template <Direction D>
+int process(cipherInstance* cipher, keyInstance* key, const unsigned char* input, int inputLen,
+            unsigned char* out)
+{
+    if (cipher == nullptr || key == nullptr || (inputLen > 0 && (input == nullptr || out == nullptr)))
+        return 0;
+    if (cipher->mode == MODE_CFB1)
+        return runCfb1(cipher, key, input, inputLen, out, D);
+
+    const unsigned char direction = D == Direction::kEncrypt ? DIR_ENCRYPT : DIR_DECRYPT;
+    if (key->direction != direction)
+        ReverseRoundSubkeys(key, direction);
+
+    if (inputLen <= 0)
+        return inputLen;
+    // A last partial block counts as a whole one.
+    const long blocks = (inputLen - 1L) / BLOCK_SIZE + 1;
+    uint32_t subkeys[kSubkeyWords];
+    std::memcpy(subkeys, key->subKeys, sizeof subkeys);
+    const uint32_t* s = &key->sBox8x32[0][0];
+    const int rounds = roundsOf(key);
+
+    if (cipher->mode == MODE_CBC) {
+        uint32_t chain[4];
+        std::memcpy(chain, cipher->iv32, sizeof chain);
+        runChained<D>(s, subkeys, rounds, blocks, chain, input, out);
+        std::memcpy(cipher->iv32, chain, sizeof chain);
+    } else if (rounds == kMaxRounds) {
+        runCodeBook<D>(s, subkeys, kMaxRounds, blocks, input, out);
+    } else {
+        runCodeBook<D>(s, subkeys, rounds, blocks, input, out);
+    }
+    return inputLen;
+}
+
+}  // namespace
+
+extern "C" {
+
+int blockEncrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input, int inputLen,
+                 unsigned char* outBuffer)
+{
+    return process<Direction::kEncrypt>(cipher, key, input, inputLen, outBuffer);
+}
+
+int blockDecrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input, int inputLen,
+                 unsigned char* outBuffer)
+{
+    return process<Direction::kDecrypt>(cipher, key, input, inputLen, outBuffer);
+}
+
+}  // extern "C"

@@ -1,0 +1,37 @@
+// Word helpers shared by the engine's key schedule and block code. Bytes of
+// a word are numbered from the most significant end: byte 0 is bits 31-24.
+#ifndef TESSALINE_SRC_CRYPT_TWOFISH_INTERNAL_H
+#define TESSALINE_SRC_CRYPT_TWOFISH_INTERNAL_H
+
+#include <stdint.h>
+
+#include "tessaline/crypt/twofish.h"
+
+namespace tessaline_crypt {
+
+constexpr int kRoundSubkeyPairs = 16;
+constexpr int kWhiteningWords = 8;
+constexpr int kMaxRounds = 16;
+
+constexpr int byteShift(int byteIndex) { return 24 - 8 * byteIndex; }
+
+constexpr uint32_t byteOf(uint32_t word, int byteIndex)
+{
+    return (word >> byteShift(byteIndex)) & 0xFF;
+}
+
+constexpr uint32_t rotateLeft(uint32_t x, int n) { return (x << n) | (x >> (32 - n)); }
+constexpr uint32_t rotateRight(uint32_t x, int n) { return (x >> n) | (x << (32 - n)); }
+
+// Rounds a key instance runs, held to what subKeys has room for.
+inline int roundsOf(const keyInstance* key)
+{
+    const int rounds = key->numRounds;
+    if (rounds < 0)
+        return 0;
+    return rounds > kMaxRounds ? kMaxRounds : rounds & ~1;
+}
+
+}  // namespace tessaline_crypt
+
+#endif

@@ -1,0 +1,101 @@
+// MThread: acting on a running thread from outside, and the operations on
+// the calling thread.
+#include <cerrno>
+#include <csignal>
+#include <sched.h>
+
+#include "thread/relaxed.h"
+#include "thread/thread_state.h"
+#include "tessaline/thread/MThread.h"
+
+using tessaline::loadRelaxed;
+using tessaline::storeRelaxed;
+using tessaline::ThreadObjectLock;
+
+namespace {
+
+constexpr int kNotAvailable = -4;
+
+}  // namespace
+
+unsigned long MThread::ThreadID()
+{
+    return pthread_self();
+}
+
+void MThread::YieldThread()
+{
+    sched_yield();
+}
+
+void MThread::Exit(void* value)
+{
+    pthread_exit(value);
+}
+
+int MThread::Once(void (*routine)(), int* control)
+{
+    if (control == nullptr || routine == nullptr) {
+        return CHECK_SYSERROR(EINVAL);
+    }
+    return CHECK_SYSERROR(pthread_once(control, routine));
+}
+
+unsigned long MThread::Self()
+{
+    const unsigned long self = pthread_self();
+    ThreadObjectLock lock(*this);
+    storeRelaxed(m_thread, self);
+    return self;
+}
+
+int MThread::Suspend()
+{
+    return kNotAvailable;
+}
+
+int MThread::Resume()
+{
+    return kNotAvailable;
+}
+
+void MThread::Cancel()
+{
+    StoreLastError(tessaline::requestCancel(*this));
+    storeRelaxed(m_cancelled, 1);
+    YieldThread();
+}
+
+int MThread::Kill(int* err)
+{
+    // Kill's documented effect on the caller; the library's own locked spans
+    // hold cancellation off, so they stay safe under it.
+    pthread_setcanceltype(PTHREAD_CANCEL_ASYNCHRONOUS, nullptr);  // NOLINT(cert-pos47-c,concurrency-thread-canceltype-asynchronous)
+    pthread_setcancelstate(PTHREAD_CANCEL_ENABLE, nullptr);
+    const int result = tessaline::requestCancel(*this);
+    StoreLastError(result);
+    YieldThread();
+    if (err != nullptr) {
+        *err = result;
+    }
+    return CHECK_SYSERROR(result);
+}
+
+void MThread::Priority(MThread_::ThreadPriority /*priority*/) {}
+
+MThread_::ThreadPriority MThread::Priority()
+{
+    return m_priority;
+}
+
+bool MThread::Exists()
+{
+    ThreadObjectLock lock(*this);
+    const unsigned long target = loadRelaxed(m_thread);
+    return target != 0 && pthread_kill(target, 0) == 0;
+}
+
+MThread::operator unsigned long() const
+{
+    return loadRelaxed(m_thread);
+}

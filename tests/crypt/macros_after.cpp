@@ -1,0 +1,19 @@
+// The host's macros come after the engine's header.
+#include "tessaline/crypt/twofish.h"
+#include "tessaline/crypt/rvEncrypt.h"
+#include "host_macros.h"
+
+#include <gtest/gtest.h>
+
+extern "C" int CHostRoundTrip(void);
+
+TEST(HeaderCoexistence, HostMacrosDefinedAfter)
+{
+    EXPECT_EQ(16, BLOCK_SIZE);
+    EXPECT_EQ(1, TRUE);
+}
+
+TEST(HeaderCoexistence, HeadersCompileAsC)
+{
+    EXPECT_EQ(1, CHostRoundTrip());
+}

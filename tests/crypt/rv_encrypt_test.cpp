@@ -1,0 +1,289 @@
+#include <cctype>
+#include <cstring>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "tessaline/crypt/rvEncrypt.h"
+
+namespace {
+
+char kKey128[] = "00112233445566778899AABBCCDDEEFF";
+char kKey256[] = "000102030405060708090A0B0C0D0E0F101112131415161718191A1B1C1D1E1F";
+
+std::string Encrypt(std::string payload)
+{
+    std::string out((payload.size() / 16 + 2) * 32 + 5, '\xEE');
+    EXPECT_EQ(1, rvEncrypt(reinterpret_cast<unsigned char*>(&payload[0]), payload.size(), &out[0]));
+    return out.c_str();
+}
+
+struct Decrypted {
+    int result;
+    std::string bytes;  // `length` bytes of out
+    unsigned long length;
+    unsigned int wasPlain;
+};
+
+Decrypted Decrypt(std::string text, unsigned long capacity = 256)
+{
+    std::vector<unsigned char> out(capacity + 1, 0xEE);
+    Decrypted d{0, "", capacity, 7};
+    d.result = rvDecrypt(&text[0], out.data(), &d.length, &d.wasPlain);
+    d.bytes.assign(reinterpret_cast<char*>(out.data()), d.length <= capacity ? d.length : 0);
+    return d;
+}
+
+std::string Chained(const std::string& head)
+{
+    return head + std::string(80 - head.size(), '0');
+}
+
+}  // namespace
+
+TEST(RvEncrypt, KnownTextAndBlockCounts)
+{
+    EXPECT_EQ("D9F35E45F0B32BB01E0F8FA0FC5041E80CAB", Encrypt("Hello World!"));
+    EXPECT_EQ(36u, Encrypt(std::string(12, 'x')).size());
+    EXPECT_EQ(68u, Encrypt(std::string(13, 'x')).size());
+    // Zero filler: one value always gives one text.
+    EXPECT_EQ(Encrypt("a"), Encrypt("a"));
+
+    char out[4] = "zzz";
+    unsigned char data[1] = {'q'};
+    EXPECT_EQ(1, rvEncrypt(data, 0, out));
+    EXPECT_STREQ("", out);
+    EXPECT_EQ(0, rvEncrypt(nullptr, 1, out));
+    EXPECT_EQ(0, rvEncrypt(data, 1, nullptr));
+}
+
+TEST(RvDecrypt, EncryptedTextComesBackExactly)
+{
+    const std::string payload("a\0b\0\0c with NULs", 17);
+    const std::string text = Encrypt(payload);
+    Decrypted d = Decrypt(text);
+    EXPECT_EQ(1, d.result);
+    EXPECT_EQ(payload, d.bytes);
+    EXPECT_EQ(17ul, d.length);
+    EXPECT_EQ(0u, d.wasPlain);
+
+    // Smaller capacity: the first capacity bytes, still a success.
+    d = Decrypt(text, 3);
+    EXPECT_EQ(1, d.result);
+    EXPECT_EQ(std::string("a\0b", 3), d.bytes);
+
+    // Lower-case digits are read too; head and tail are not.
+    std::string lower = text;
+    for (std::size_t i = 2; i + 2 < lower.size(); ++i)
+        lower[i] = static_cast<char>(std::tolower(lower[i]));
+    EXPECT_EQ(payload, Decrypt(lower).bytes);
+    for (std::size_t position : {0u, 34u, 35u}) {
+        std::string marked = Encrypt("Hello World!");
+        marked[position] = static_cast<char>(std::tolower(marked[position]));
+        d = Decrypt(marked);
+        EXPECT_EQ(1u, d.wasPlain) << marked;
+        EXPECT_EQ(marked, d.bytes);
+    }
+}
+
+TEST(RvDecrypt, ClearAndEmptyText)
+{
+    Decrypted d = Decrypt("hello");
+    EXPECT_EQ(1, d.result);
+    EXPECT_EQ("hello", d.bytes);
+    EXPECT_EQ(1u, d.wasPlain);
+
+    {
+        std::string text = "hello";
+        unsigned char out[8];
+        std::memset(out, 0xEE, sizeof out);
+        unsigned long length = 3;
+        unsigned int wasPlain = 0;
+        EXPECT_EQ(1, rvDecrypt(&text[0], out, &length, &wasPlain));
+        EXPECT_STREQ("he", reinterpret_cast<char*>(out));
+        EXPECT_EQ(3ul, length);
+        EXPECT_EQ(1u, wasPlain);
+        for (unsigned long capacity : {0ul, 1ul}) {
+            length = capacity;
+            out[0] = 'x';
+            EXPECT_EQ(1, rvDecrypt(&text[0], out, &length, nullptr));
+            EXPECT_EQ('\0', out[0]);
+            EXPECT_EQ(capacity, length);
+        }
+        length = 6;
+        EXPECT_EQ(1, rvDecrypt(&text[0], out, &length, nullptr));
+        EXPECT_STREQ("hello", reinterpret_cast<char*>(out));
+        EXPECT_EQ(5ul, length);
+    }
+    {
+        char empty[] = "";
+        unsigned char out[2] = {'x', 'y'};
+        unsigned long length = 99;
+        unsigned int wasPlain = 0;
+        EXPECT_EQ(1, rvDecrypt(empty, out, &length, &wasPlain));
+        EXPECT_EQ('\0', out[0]);
+        EXPECT_EQ(99ul, length);
+        EXPECT_EQ(1u, wasPlain);
+    }
+    // 36 characters without the head, or of the wrong length, are clear text.
+    const std::string unmarked = "X9" + std::string(32, '0') + "AB";
+    EXPECT_EQ(unmarked, Decrypt(unmarked).bytes);
+    const std::string shortMark = "D9" + std::string(31, '0') + "AB";
+    EXPECT_EQ(shortMark, Decrypt(shortMark).bytes);
+    EXPECT_EQ("D9AB", Decrypt("D9AB").bytes);
+}
+
+TEST(RvDecrypt, ChainedText)
+{
+    Decrypted d = Decrypt(Chained("26622E100D0900036F"));
+    EXPECT_EQ(1, d.result);
+    EXPECT_EQ("hello", d.bytes);
+    EXPECT_EQ(5ul, d.length);
+    EXPECT_EQ(1u, d.wasPlain);
+
+    // Capacity under 37 refuses; any 80 characters are chained, never clear.
+    EXPECT_EQ(0, Decrypt(Chained("26622E100D0900036F"), 36).result);
+    EXPECT_EQ(1, Decrypt(std::string(80, 'z')).result);
+    EXPECT_NE(std::string(80, 'z'), Decrypt(std::string(80, 'z')).bytes);
+
+    // A pair that isn't hex takes strtoul's value: "G1" reads as 0, " F" as 15.
+    EXPECT_EQ(Decrypt(Chained("00000000G1")).bytes, "");
+    EXPECT_EQ(Decrypt(Chained("00000000 F")).bytes, "\x0F");
+
+    // 36 characters at most, always terminated.
+    std::string full;
+    for (int i = 0; i < 39; ++i)
+        full += "00";
+    full += "41";
+    std::vector<unsigned char> out(64, 0xEE);
+    unsigned long length = 64;
+    EXPECT_EQ(1, rvDecrypt(&full[0], out.data(), &length, nullptr));
+    EXPECT_EQ(36ul, length);
+    EXPECT_EQ(std::string(36, 'A'), std::string(out.begin(), out.begin() + 36));
+    EXPECT_EQ('\0', out[36]);
+}
+
+TEST(TwoFishText, KeysAndRoundTrips)
+{
+    std::string payload = "a payload of more than one block, 256-bit key";
+    std::vector<char> text(200);
+    auto* bytes = reinterpret_cast<unsigned char*>(&payload[0]);
+    for (char* key : {kKey128, kKey256}) {
+        ASSERT_EQ(1, TwoFishEncrypt(key, bytes, payload.size(), text.data()));
+        EXPECT_EQ(128u, std::strlen(text.data()));
+        std::vector<unsigned char> out(payload.size());
+        unsigned long length = out.size();
+        ASSERT_EQ(1, TwoFishDecrypt(key, text.data(), out.data(), &length));
+        EXPECT_EQ(payload, std::string(out.begin(), out.begin() + length));
+    }
+
+    char key31[] = "00112233445566778899AABBCCDDEEF";
+    char key48[] = "00112233445566778899AABBCCDDEEFF0011223344556677";
+    for (char* key : {key31, key48}) {
+        EXPECT_EQ(0, TwoFishEncrypt(key, bytes, 4, text.data()));
+        unsigned long length = 4;
+        unsigned char out[4];
+        EXPECT_EQ(0, TwoFishDecrypt(key, text.data(), out, &length));
+    }
+
+    // The fixed key is the one rvEncrypt uses.
+    char fixedKey[] = "3A9F0C52E8B1476D90AD2F63C1E47B58";
+    unsigned char hello[] = "Hello World!";
+    ASSERT_EQ(1, TwoFishEncrypt(fixedKey, hello, 12, text.data()));
+    EXPECT_STREQ("F35E45F0B32BB01E0F8FA0FC5041E80C", text.data());
+}
+
+TEST(TwoFishText, NullsAndMalformedTextAreSafe)
+{
+    unsigned char data[4] = {1, 2, 3, 4};
+    char text[80] = "";
+    unsigned char out[64];
+    unsigned long length = sizeof out;
+    EXPECT_EQ(0, TwoFishEncrypt(nullptr, data, 4, text));
+    EXPECT_EQ(0, TwoFishEncrypt(kKey128, nullptr, 4, text));
+    EXPECT_EQ(0, TwoFishEncrypt(kKey128, data, 4, nullptr));
+    EXPECT_EQ(0, TwoFishDecrypt(nullptr, text, out, &length));
+    EXPECT_EQ(0, TwoFishDecrypt(kKey128, nullptr, out, &length));
+    EXPECT_EQ(0, TwoFishDecrypt(kKey128, text, nullptr, &length));
+    EXPECT_EQ(0, TwoFishDecrypt(kKey128, text, out, nullptr));
+    EXPECT_EQ(0, rvDecrypt(nullptr, out, &length, nullptr));
+    EXPECT_EQ(0, rvDecrypt(text, nullptr, &length, nullptr));
+    EXPECT_EQ(0, rvDecrypt(text, out, nullptr, nullptr));
+
+    // Text shorter than a block, of odd length, or with trailing half
+    // blocks: only whole blocks count, nothing is read past the text.
+    ASSERT_EQ(1, TwoFishEncrypt(kKey128, data, 4, text));
+    const std::string whole = text;
+    for (const std::string& shape : {std::string(), std::string("A"), whole.substr(0, 31),
+                                     whole + "F", whole + "0123456789ABCDEF0"}) {
+        std::vector<char> copy(shape.begin(), shape.end());
+        copy.push_back('\0');
+        length = sizeof out;
+        EXPECT_EQ(1, TwoFishDecrypt(kKey128, copy.data(), out, &length)) << shape;
+        if (shape.size() < 32)
+            EXPECT_EQ(0ul, length) << shape;
+        else
+            EXPECT_EQ(std::string(data, data + 4), std::string(out, out + length)) << shape;
+    }
+
+    // Non-hex digits and a wrong key still "succeed", within the buffers.
+    std::string garbled = "D9" + std::string(64, 'Q') + "AB";
+    Decrypted d = Decrypt(garbled, 1000);
+    EXPECT_EQ(1, d.result);
+    EXPECT_LE(d.length, 60ul);
+    length = sizeof out;
+    EXPECT_EQ(1, TwoFishDecrypt(kKey256, &std::string(whole)[0], out, &length));
+    EXPECT_LE(length, 28ul);
+}
+
+TEST(TwoFishText, LargePayloads)
+{
+    std::string payload(1 << 20, '\0');
+    for (std::size_t i = 0; i < payload.size(); ++i)
+        payload[i] = static_cast<char>(i * 7);
+    const std::string text = Encrypt(payload);
+    EXPECT_EQ(4u + 32u * ((payload.size() + 3) / 16 + 1), text.size());
+    Decrypted d = Decrypt(text, payload.size());
+    EXPECT_EQ(1, d.result);
+    EXPECT_TRUE(d.bytes == payload);
+
+    // A length whose bit count would overflow is refused before any read.
+    unsigned char data[1] = {0};
+    char out[64];
+    EXPECT_EQ(0, TwoFishEncrypt(kKey128, data, (1ul << 28) - 4, out));
+    EXPECT_EQ(0, rvEncrypt(data, ~0ul, out));
+}
+
+// Calls TwoFishHere as the first thing it does; the barrier keeps the call
+// from becoming a tail jump.
+__attribute__((noinline)) unsigned long CallSite(unsigned long argument)
+{
+    const unsigned long here = TwoFishHere(argument);
+    asm volatile("" ::: "memory");
+    return here;
+}
+
+TEST(TwoFishHere, ReturnsItsCallSite)
+{
+    const unsigned long here = CallSite(0);
+    EXPECT_EQ(here, CallSite(99)) << "the argument has no effect";
+    const unsigned long start = reinterpret_cast<unsigned long>(&CallSite);
+    EXPECT_GT(here, start);
+    EXPECT_LT(here - start, 256ul) << "the return address lies inside the caller";
+}
+
+TEST(RvuiExports, PassArgumentsThrough)
+{
+    unsigned char data[] = "Hello World!";
+    char text[64];
+    EXPECT_EQ(1, RVUI_Encrypt(data, 12, text));
+    EXPECT_STREQ("D9F35E45F0B32BB01E0F8FA0FC5041E80CAB", text);
+    unsigned char out[16];
+    unsigned long length = sizeof out;
+    unsigned int wasPlain = 5;
+    EXPECT_EQ(1, RVUI_Decrypt(text, out, &length, &wasPlain));
+    EXPECT_EQ(12ul, length);
+    EXPECT_EQ(0u, wasPlain);
+    EXPECT_EQ(0, std::memcmp(out, data, 12));
+}

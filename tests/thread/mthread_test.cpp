@@ -1,0 +1,295 @@
+#include <cerrno>
+#include <csignal>
+#include <string>
+#include <thread>
+
+#include <gtest/gtest.h>
+
+#include "support/capture_stderr.h"
+#include "tessaline/tessaline.h"
+#include "thread/thread_test_support.h"
+
+using tessaline::test::CaptureStderr;
+using tessaline::test::OnOtherThread;
+using tessaline::test::SecondsFor;
+
+namespace {
+
+int g_answer = 42;
+
+// A routine that waits until the test opens the gate, then returns &g_answer.
+struct Gate {
+    MSemaphore open{0, 0};
+    Gate() { open.Init(0); }
+};
+
+void* WaitAtGate(void* gate)
+{
+    static_cast<Gate*>(gate)->open.Wait();
+    return &g_answer;
+}
+
+// What a routine that pauses has seen.
+struct Pauser {
+    MThread thread;
+    MSemaphore started{0, 0};
+    int pauseStatus = 99;
+    bool disableCancellation = false;
+    int milliseconds = 5000;
+    Pauser() { started.Init(0); }
+};
+
+void* PauseLong(void* arg)
+{
+    auto& pauser = *static_cast<Pauser*>(arg);
+    if (pauser.disableCancellation) {
+        pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, nullptr);
+    }
+    pauser.started.Signal();
+    pauser.pauseStatus = pauser.thread.Pause(nullptr, pauser.milliseconds);
+    return nullptr;
+}
+
+int Load(const int& field)
+{
+    return __atomic_load_n(&field, __ATOMIC_RELAXED);
+}
+
+// For a thread that detached itself: once m_finished is seen under the
+// mutex, the thread is done with the object.
+void WaitUntilFinished(MThread& thread)
+{
+    thread.m_mutex->Lock(nullptr);
+    while (Load(thread.m_finished) == 0) {
+        thread.m_cond->Wait(*thread.m_mutex, nullptr, 0);
+    }
+    thread.m_mutex->Unlock(nullptr);
+}
+
+}  // namespace
+
+TEST(MThread, TimedWaitRunsOutThenJoinDeliversTheResult)
+{
+    Gate gate;
+    MThread thread(MThread_::PriorityHigh);
+    ASSERT_EQ(0, thread.Create(WaitAtGate, &gate, 0, 0, 0, nullptr));
+    EXPECT_EQ(1, thread.m_state);
+    EXPECT_TRUE(thread.Exists());
+
+    int* result = nullptr;
+    int status = 0;
+    EXPECT_LE(SecondsFor([&] { status = thread.Wait(&result, nullptr, 1); }), 1.1);
+    EXPECT_EQ(-5, status);
+    EXPECT_EQ(ETIMEDOUT, thread.LastError());
+    EXPECT_EQ(nullptr, result);
+
+    gate.open.Signal();
+    EXPECT_EQ(0, thread.Wait(&result, nullptr, -1));
+    EXPECT_EQ(&g_answer, result);
+    EXPECT_EQ(1, thread.m_finished);
+    EXPECT_EQ(0UL, static_cast<unsigned long>(thread));
+    EXPECT_FALSE(thread.Exists());
+    EXPECT_EQ(-1, thread.Wait(&result, nullptr, 0));
+}
+
+TEST(MThread, UntimedWaitWaitsForTheEndThenJoins)
+{
+    Gate gate;
+    MThread thread;
+    ASSERT_EQ(0, thread.Create(WaitAtGate, &gate, 64 * 1024, 0, 0, nullptr));
+    std::thread opener([&] { gate.open.Signal(); });
+    int* result = nullptr;
+    EXPECT_EQ(0, thread.Wait(&result, nullptr, 0));
+    EXPECT_EQ(&g_answer, result);
+    opener.join();
+}
+
+TEST(MThread, ObjectWithoutAThread)
+{
+    MThread thread(MThread_::PriorityLow);
+    EXPECT_EQ(-1, thread.Wait(nullptr, nullptr, 0));
+    EXPECT_EQ(-1, thread.Wait(nullptr, nullptr, -1));
+    EXPECT_FALSE(thread.Exists());
+    EXPECT_EQ(-4, thread.Suspend());
+    EXPECT_EQ(-4, thread.Resume());
+    EXPECT_EQ(0, thread.Pause(nullptr, 0));
+    thread.Priority(MThread_::PriorityHighest);
+    EXPECT_EQ(MThread_::PriorityLow, thread.Priority());
+
+    CaptureStderr capture;
+    thread.Cancel();
+    EXPECT_EQ(ESRCH, thread.LastError());
+    EXPECT_EQ(1, thread.m_cancelled);
+    EXPECT_EQ(-6, thread.Pause(nullptr, 0));
+    // Kill changes the caller's cancellation type: keep that off this thread.
+    int err = 0;
+    EXPECT_EQ(-1, OnOtherThread([&] { return thread.Kill(&err); }));
+    EXPECT_EQ(ESRCH, err);
+    EXPECT_EQ("", capture.Text());
+}
+
+TEST(MThread, OneObjectStartsOneThread)
+{
+    Gate gate;
+    MThread thread;
+    ASSERT_EQ(0, thread.Create(WaitAtGate, &gate, 0, 0, 0, nullptr));
+    CaptureStderr capture;
+    EXPECT_EQ(-1, thread.Create(WaitAtGate, &gate, 0, 0, 0, nullptr));
+    EXPECT_EQ(EBUSY, thread.LastError());
+    EXPECT_NE(std::string::npos, capture.Text().find("(16)\n"));
+    gate.open.Signal();
+    EXPECT_EQ(0, thread.Wait(nullptr, nullptr, -1));
+}
+
+TEST(MThread, DetachedThreadIsGivenUpAtOnce)
+{
+    Gate gate;
+    MThread thread;
+    ASSERT_EQ(0, thread.Create(WaitAtGate, &gate, 0, 1, 0, nullptr));
+    EXPECT_EQ(3, thread.m_state);
+    EXPECT_EQ(0UL, static_cast<unsigned long>(thread));
+    EXPECT_FALSE(thread.Exists());
+    EXPECT_EQ(-1, thread.Wait(nullptr, nullptr, 0));
+    gate.open.Signal();
+    WaitUntilFinished(thread);
+    EXPECT_EQ(0, Load(thread.m_cancelled));
+}
+
+TEST(MThread, DetachLetsGoOfARunningThread)
+{
+    Gate gate;
+    MThread thread;
+    ASSERT_EQ(0, thread.Create(WaitAtGate, &gate, 0, 0, 0, nullptr));
+    EXPECT_EQ(0, thread.Detach());
+    EXPECT_EQ(3, thread.m_state);
+    EXPECT_EQ(-1, thread.Wait(nullptr, nullptr, 0));
+    gate.open.Signal();
+    WaitUntilFinished(thread);
+}
+
+TEST(MThread, CancelDuringPauseEndsTheThreadThroughCancelThread)
+{
+    Pauser pauser;
+    ASSERT_EQ(0, pauser.thread.Create(PauseLong, &pauser, 0, 0, 0, nullptr));
+    ASSERT_EQ(0, pauser.started.Wait());
+    double seconds = SecondsFor([&] {
+        pauser.thread.Cancel();
+        EXPECT_EQ(0, pauser.thread.LastError());
+        // 3 if Wait found the thread still there, -1 if it had already gone.
+        const int status = pauser.thread.Wait(nullptr, nullptr, 0);
+        EXPECT_TRUE(status == 3 || status == -1) << status;
+    });
+    EXPECT_LT(seconds, 4.0);
+    WaitUntilFinished(pauser.thread);
+    EXPECT_EQ(99, pauser.pauseStatus);
+    EXPECT_EQ(1, Load(pauser.thread.m_cancelled));
+    EXPECT_EQ(3, pauser.thread.m_state);
+    EXPECT_EQ(0UL, static_cast<unsigned long>(pauser.thread));
+    EXPECT_FALSE(pauser.thread.Exists());
+}
+
+TEST(MThread, PauseWithCancellationDisabledEndsAfterItsSlice)
+{
+    Pauser pauser;
+    pauser.disableCancellation = true;
+    pauser.milliseconds = 1000;
+    ASSERT_EQ(0, pauser.thread.Create(PauseLong, &pauser, 0, 0, 0, nullptr));
+    ASSERT_EQ(0, pauser.started.Wait());
+    pauser.thread.Cancel();
+    EXPECT_EQ(0, pauser.thread.Wait(nullptr, nullptr, -1));
+    EXPECT_EQ(-6, pauser.pauseStatus);
+    EXPECT_EQ(1, pauser.thread.m_state);
+}
+
+TEST(MThread, KillCancelsTheThreadAndSparesTheProcess)
+{
+    Pauser pauser;
+    ASSERT_EQ(0, pauser.thread.Create(PauseLong, &pauser, 0, 0, 0, nullptr));
+    ASSERT_EQ(0, pauser.started.Wait());
+    int err = -1;
+    EXPECT_EQ(0, OnOtherThread([&] { return pauser.thread.Kill(&err); }));
+    EXPECT_EQ(0, err);
+    WaitUntilFinished(pauser.thread);
+    EXPECT_EQ(99, pauser.pauseStatus);
+    EXPECT_EQ(1, Load(pauser.thread.m_cancelled));
+}
+
+TEST(MThread, ExitCountsAsCancelled)
+{
+    MThread thread;
+    ASSERT_EQ(0, thread.Create([](void*) -> void* { MThread::Exit(&g_answer); }, nullptr, 0, 0, 0, nullptr));
+    const int status = thread.Wait(nullptr, nullptr, 0);
+    EXPECT_TRUE(status == 3 || status == -1) << status;
+    WaitUntilFinished(thread);
+    EXPECT_EQ(1, Load(thread.m_cancelled));
+    EXPECT_EQ(3, thread.m_state);
+}
+
+TEST(MThread, CreatedThreadBlocksEverySignalButKill)
+{
+    MThread thread;
+    sigset_t mask;
+    sigemptyset(&mask);
+    ASSERT_EQ(0, thread.Create([](void* arg) -> void* {
+        pthread_sigmask(SIG_BLOCK, nullptr, static_cast<sigset_t*>(arg));
+        return nullptr;
+    }, &mask, 0, 0, 0, nullptr));
+    ASSERT_EQ(0, thread.Wait(nullptr, nullptr, -1));
+    for (int signal : {SIGHUP, SIGINT, SIGQUIT, SIGUSR1, SIGUSR2, SIGPIPE, SIGALRM, SIGTERM, SIGCHLD}) {
+        EXPECT_EQ(1, sigismember(&mask, signal)) << signal;
+    }
+    EXPECT_EQ(0, sigismember(&mask, SIGKILL));
+}
+
+TEST(MThread, CountsObjectsThroughCopiesAndAssignsOnlyTheThreadFields)
+{
+    const int before = __atomic_load_n(&MThread_::m_threadCnt, __ATOMIC_RELAXED);
+    {
+        Gate gate;
+        MThread first(MThread_::PriorityHigh);
+        MThread second(MThread_::PriorityLow);
+        ASSERT_EQ(0, first.Create(WaitAtGate, &gate, 0, 0, 0, nullptr));
+        MThread copy(first);
+        EXPECT_EQ(before + 3, __atomic_load_n(&MThread_::m_threadCnt, __ATOMIC_RELAXED));
+        EXPECT_NE(first.m_mutex, copy.m_mutex);
+        EXPECT_NE(first.m_cond, copy.m_cond);
+        EXPECT_EQ(1, copy.m_state);
+        EXPECT_EQ(MThread_::PriorityHigh, copy.Priority());
+
+        second = first;
+        EXPECT_EQ(static_cast<unsigned long>(first), static_cast<unsigned long>(second));
+        EXPECT_EQ(&WaitAtGate, second.m_routine);
+        EXPECT_EQ(0, second.m_state);
+        EXPECT_EQ(MThread_::PriorityLow, second.Priority());
+
+        gate.open.Signal();
+        EXPECT_EQ(0, copy.Wait(nullptr, nullptr, -1));
+        // first still names the thread that copy joined; its destructor would
+        // detach that stale identifier.
+        first.m_thread = 0;
+    }
+    EXPECT_EQ(before, __atomic_load_n(&MThread_::m_threadCnt, __ATOMIC_RELAXED));
+}
+
+TEST(MThread, SelfAdoptsTheCallingThreadWithoutDetachingIt)
+{
+    std::thread host([] {
+        MThread thread;
+        EXPECT_EQ(static_cast<unsigned long>(pthread_self()), thread.Self());
+        EXPECT_EQ(MThread::ThreadID(), static_cast<unsigned long>(thread));
+        EXPECT_TRUE(thread.Exists());
+    });
+    // Still joinable: the adopting object let it be.
+    host.join();
+}
+
+TEST(MThread, OnceRunsItsRoutineOnce)
+{
+    static int calls = 0;
+    int control = 0;
+    EXPECT_EQ(0, MThread::Once([] { ++calls; }, &control));
+    EXPECT_EQ(0, MThread::Once([] { ++calls; }, &control));
+    EXPECT_EQ(1, calls);
+    CaptureStderr capture;
+    EXPECT_EQ(-1, MThread::Once([] {}, nullptr));
+}
