@@ -14,7 +14,6 @@
 #include <sys/vfs.h>
 #include <time.h>
 
-#include "tessaline/util/export.h"
 
 namespace tessaline::files {
 
@@ -43,9 +42,9 @@ struct SysCalls {
     long (*pathconf)(const char* path, int name);
 };
 
-// The live table. Exported only so that the test programs, which link the
-// shared library, can reach it.
-TESSALINE_API SysCalls& Sys();
+// The live table. Tests reach it by linking the library's objects
+// statically; the shared object does not export it.
+SysCalls& Sys();
 
 // Restores the table as it was at construction.
 class ScopedSysCalls {
