@@ -1,9 +1,8 @@
 // Test seam of the configuration store's system calls: a test can make any
-// of them fail with a chosen errno, without running it. Not installed.
+// of them fail with a chosen errno, without running it. Not installed and
+// not exported: tests reach it by linking the library's objects statically.
 #ifndef TESSALINE_SRC_CONFIG_SYS_SEAM_H
 #define TESSALINE_SRC_CONFIG_SYS_SEAM_H
-
-#include "tessaline/util/export.h"
 
 namespace tessaline::config::testing {
 
@@ -14,7 +13,7 @@ enum class SysCall { Open, Exists, Writable, Write, Sync, Close, Rename, Unlink 
 // fails. Null restores the real calls.
 typedef int (*FaultHook)(SysCall call, const char* path);
 
-TESSALINE_API void SetFaultHook(FaultHook hook);
+void SetFaultHook(FaultHook hook);
 
 }  // namespace tessaline::config::testing
 
