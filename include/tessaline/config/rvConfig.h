@@ -97,7 +97,7 @@ public:
         /// Takes `other`'s text and leaves `other` empty.
         cfgStr(cfgStr&& other) noexcept { swap(other); }
         /// Shares `other`'s text and drops the old one.
-        cfgStr& operator=(const cfgStr& other)
+        cfgStr& operator=(const cfgStr& other)  // NOLINT(cert-oop54-cpp): the rope's assignment is self-safe
         {
             __gnu_cxx::crope::operator=(other);
             return *this;
