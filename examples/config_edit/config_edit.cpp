@@ -36,8 +36,11 @@ void printFile(const std::string& path)
     FILE* in = std::fopen(path.c_str(), "r");
     char line[4096];
     while (in != nullptr && std::fgets(line, sizeof line, in) != nullptr) {
-        const bool idLine = std::strncmp(line, rvConfig::m_szIdString, std::strlen(rvConfig::m_szIdString)) == 0;
-        std::printf("  | %s", idLine ? "# Edited by Tessaline: <time of the save>\n" : line);
+        if (std::strncmp(line, rvConfig::m_szIdString, std::strlen(rvConfig::m_szIdString)) == 0) {
+            std::printf("  | %s: <time of the save>\n", rvConfig::m_szIdString);
+        } else {
+            std::printf("  |%s%s", line[0] == '\n' ? "" : " ", line);
+        }
     }
     if (in != nullptr) {
         std::fclose(in);
@@ -71,7 +74,8 @@ int main()
         std::printf("saved: %u\n", config.Flush(0));
     }
 
-    std::printf("\nThe saved file:\n");
+    std::printf("\nThe saved file: comments stay, a new key ends its section (after the\n"
+                "blank line that closed it), a new section comes last.\n");
     printFile(path);
 
     rvConfig reread(path.c_str(), rvConfig::OpenRead);
