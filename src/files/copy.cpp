@@ -2,6 +2,8 @@
 #include "tessaline/files/rvCopy.h"
 
 #include <algorithm>
+#include <cerrno>
+#include <cstdint>
 #include <cstring>
 
 #include <fcntl.h>
@@ -92,6 +94,32 @@ bool WriteAll(void* handle, const char* data, unsigned long count)
     return true;
 }
 
+int Descriptor(void* handle)
+{
+    return static_cast<int>(reinterpret_cast<intptr_t>(handle));
+}
+
+// Moves up to `left` bytes with copy_file_range, which lets the kernel copy
+// (or share) the data without a trip through user space, and returns what is
+// still to copy. It stops at the first call that moves nothing, whatever the
+// reason (no support across these file systems, a special file, an error,
+// the end of a source that shrank): the offsets of both descriptors stand
+// where the kernel left them, so the buffered loop carries on from there and
+// meets any real failure itself.
+int64_t CopyInKernel(void* from, void* to, int64_t left)
+{
+    constexpr int64_t kMaxChunk = int64_t{1} << 30;
+    while (left != 0) {
+        const ssize_t moved = Sys().copy_file_range(Descriptor(from), nullptr, Descriptor(to),
+                                                    nullptr, static_cast<size_t>(std::min(left, kMaxChunk)), 0);
+        if (moved <= 0) {
+            break;
+        }
+        left -= moved;
+    }
+    return left;
+}
+
 // Copies the source's size in bytes, as it stood when the copy began. A read
 // that finds the end early (the source shrank) fails; one that would pass
 // the size (the source grew) is cut to it.
@@ -101,6 +129,9 @@ bool CopyBytes(void* from, void* to)
     if (left < 0) {
         return false;
     }
+    const int savedErrno = errno;
+    left = CopyInKernel(from, to, left);
+    errno = savedErrno;  // a declined kernel copy is no failure of this one
     char buffer[kCopyBufferSize];
     while (left != 0) {
         const unsigned long want =

@@ -33,7 +33,7 @@ int StatFileSystem(const char* path, struct statfs* info)
 SysCalls g_sys = {
     OpenFile, ::close, ::read, ::write, ::lseek, StatHandle, StatPath, ::lockf,
     ::access, ::chmod, ::mkdir, ::unlink, ::rmdir, ::symlink, ::realpath, StatFileSystem,
-    ::nanosleep, ::opendir, ::readdir, ::closedir, ::pathconf,
+    ::nanosleep, ::opendir, ::readdir, ::closedir, ::pathconf, ::copy_file_range,
 };
 
 }  // namespace

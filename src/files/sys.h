@@ -40,6 +40,8 @@ struct SysCalls {
     struct dirent* (*readdir)(DIR* dir);
     int (*closedir)(DIR* dir);
     long (*pathconf)(const char* path, int name);
+    ssize_t (*copy_file_range)(int in, off64_t* inOffset, int out, off64_t* outOffset, size_t count,
+                               unsigned int flags);
 };
 
 // The live table. Tests reach it by linking the library's objects

@@ -140,10 +140,58 @@ TEST(CopyFile, FailedCopyRemovesTheTargetAndKeepsTheSource)
         Put(target, "older target");
         ScopedSysCalls restore;
         calls = 0;
+        Sys().copy_file_range = [](int, off64_t*, int, off64_t*, size_t, unsigned) -> ssize_t {
+            errno = ENOSYS;
+            return -1;
+        };
         c.breakIt();
         EXPECT_EQ(0, Copy(source, target, 0, 1, 0, 1));
         EXPECT_FALSE(Exists(target));
         EXPECT_EQ(50000u, Slurp(source).size());
+    }
+}
+
+// Wherever the kernel declines the copy, the buffered loop finishes it from
+// the offset reached, and the result is the same file.
+TEST(CopyFile, KernelCopyFallsBackToTheBufferedLoop)
+{
+    TempDir dir;
+    std::string content(100000, '\0');
+    for (size_t i = 0; i < content.size(); ++i) {
+        content[i] = static_cast<char>(i * 131 + 7);
+    }
+    const std::string source = Put(dir / "source", content);
+    const std::string target = dir / "target";
+    static const auto realCopy = Sys().copy_file_range;
+    const struct {
+        const char* what;
+        decltype(realCopy) copy;
+    } cases[] = {
+        {"kernel copy unsupported",
+         [](int, off64_t*, int, off64_t*, size_t, unsigned) -> ssize_t {
+             errno = EXDEV;
+             return -1;
+         }},
+        {"kernel copy moves nothing",
+         [](int, off64_t*, int, off64_t*, size_t, unsigned) -> ssize_t { return 0; }},
+        {"kernel copy stops after 1000 bytes",
+         [](int in, off64_t* inOffset, int out, off64_t* outOffset, size_t count,
+            unsigned flags) -> ssize_t {
+             static bool first = true;
+             if (!first) {
+                 errno = EIO;
+                 return -1;
+             }
+             first = false;
+             return realCopy(in, inOffset, out, outOffset, count < 1000 ? count : 1000, flags);
+         }},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.what);
+        ScopedSysCalls restore;
+        Sys().copy_file_range = c.copy;
+        EXPECT_EQ(1, Copy(source, target, 0, 1));
+        EXPECT_EQ(content, Slurp(target));
     }
 }
 
