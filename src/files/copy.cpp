@@ -148,11 +148,13 @@ bool CopyBytes(void* from, void* to)
     return true;
 }
 
-bool SameFile(const char* first, const char* second)
+// The target first: in a fresh copy it does not exist yet, and the source
+// need not be looked at.
+bool SameFile(const char* source, const char* target)
 {
     struct stat a;
     struct stat b;
-    return Sys().stat(first, &a) == 0 && Sys().stat(second, &b) == 0 && a.st_dev == b.st_dev &&
+    return Sys().stat(target, &b) == 0 && Sys().stat(source, &a) == 0 && a.st_dev == b.st_dev &&
            a.st_ino == b.st_ino;
 }
 
