@@ -64,5 +64,3 @@ void Flush(benchmark::State& state, Size size)
 }();
 
 }  // namespace
-
-BENCHMARK_MAIN();

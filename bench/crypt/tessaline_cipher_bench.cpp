@@ -82,5 +82,3 @@ void TextDecryptBench(benchmark::State& state)
 }();
 
 }  // namespace
-
-BENCHMARK_MAIN();

@@ -362,5 +362,3 @@ using WalkFunction = int (*)(const std::string&);
 }();
 
 }  // namespace
-
-BENCHMARK_MAIN();

@@ -191,5 +191,3 @@ void PthreadCreateJoin(benchmark::State& state)
 }();
 
 }  // namespace
-
-BENCHMARK_MAIN();
