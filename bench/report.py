@@ -166,7 +166,7 @@ def markdown(rows, medians, machine, quick):
     out.append("")
     out.append("Scaling: time per item at three sizes, and the growth of the total from one size to the next "
                "against the growth of the input (1.0 = linear).\n")
-    out.append("| Group | Implementation | " + " | ".join("size" for _ in range(3)) + " | Growth |")
+    out.append("| Group | Implementation | Small | Medium | Large | Growth |")
     out.append("|---|---|---|---|---|---|")
     for group, sizes, unit in SCALING:
         impls = sorted({impl_of(k) for k in medians if k.startswith(group + "/")},
