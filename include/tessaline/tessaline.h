@@ -22,5 +22,6 @@
 #include "tessaline/files/rvFilename.h"
 #include "tessaline/files/rvPath.h"
 #include "tessaline/files/rvSharedLib.h"
+#include "tessaline/config/rvConfig.h"
 
 #endif
