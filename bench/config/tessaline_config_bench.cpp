@@ -57,9 +57,35 @@ void Flush(benchmark::State& state, Size size)
     CountEntries(state, size);
 }
 
+// The typed getters over 100 keys of each type, in other letter case; no
+// peer has the same conversions.
+void TypedGetters(benchmark::State& state)
+{
+    rvConfig config;
+    std::vector<std::string> intKeys, doubleKeys, boolKeys;
+    for (int j = 0; j < 100; ++j) {
+        const std::string key = "key" + std::to_string(j);
+        config.PutValue(("i" + key).c_str(), j * 1000, "numbers");
+        config.PutValue(("d" + key).c_str(), j * 0.25, "numbers");
+        config.PutBool(("b" + key).c_str(), j % 2, "numbers");
+        intKeys.push_back("I" + key);
+        doubleKeys.push_back("D" + key);
+        boolKeys.push_back("B" + key);
+    }
+    for (auto _ : state) {
+        for (size_t n = 0; n < intKeys.size(); ++n) {
+            benchmark::DoNotOptimize(config.GetValue(intKeys[n].c_str(), 0, "NUMBERS"));
+            benchmark::DoNotOptimize(config.GetValue(doubleKeys[n].c_str(), 0.0, "NUMBERS"));
+            benchmark::DoNotOptimize(config.GetBool(boolKeys[n].c_str(), 0, "NUMBERS"));
+        }
+    }
+    state.SetItemsProcessed(state.iterations() * static_cast<long>(intKeys.size()) * 3);
+}
+
 [[maybe_unused]] const bool registered = [] {
     RegisterLoadLookup("tessaline", Load, Lookup);
     RegisterFlush("tessaline", Flush);
+    bench::Register("config_typed_get", "tessaline", "300", TypedGetters)->Unit(benchmark::kMicrosecond);
     return true;
 }();
 
