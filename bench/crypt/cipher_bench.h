@@ -1,7 +1,15 @@
 // Shared set-up of the cipher benchmarks: the same key, the same 16 MiB of
-// input, and a cycles-per-byte counter: the thread's CPU time in cycles of
-// the time-stamp counter (the nominal clock), so that time lost to other
-// processes on a busy machine does not count.
+// input, the same hexadecimal text step, and a cycles-per-byte counter: the
+// thread's CPU time in cycles of the time-stamp counter (the nominal clock),
+// so that time lost to other processes on a busy machine does not count.
+//
+// Groups (see common/bench_names.h):
+//   crypt_ecb_encrypt/<impl>/16MiB, crypt_ecb_decrypt/<impl>/16MiB
+//   crypt_key_setup/<impl>/128, crypt_key_setup/<impl>/256
+//   crypt_text_encrypt/<impl>/64B: Tessaline's rvEncrypt of 64 bytes (key
+//     schedule, five blocks, hex text); for a peer its key setup, four blocks
+//     and the same hex step.
+//   crypt_text_decrypt/<impl>/64B: the way back.
 #ifndef TESSALINE_BENCH_CRYPT_CIPHER_BENCH_H
 #define TESSALINE_BENCH_CRYPT_CIPHER_BENCH_H
 
@@ -13,9 +21,14 @@
 #include <benchmark/benchmark.h>
 #include <x86intrin.h>
 
+#include "common/bench_names.h"
+
 namespace cipher_bench {
 
 constexpr std::size_t kEcbBytes = 16u << 20;
+constexpr std::size_t kTextBytes = 64;
+constexpr const char* kEcbSize = "16MiB";
+constexpr const char* kTextSize = "64B";
 
 inline const uint8_t* Key256()
 {
@@ -31,6 +44,30 @@ inline std::vector<uint8_t> Input(std::size_t size)
     for (std::size_t i = 0; i < size; ++i)
         bytes[i] = static_cast<uint8_t>(i * 131 + 7);
     return bytes;
+}
+
+// The text step of the peers: complemented bytes as upper-case hex digits,
+// as the library writes them.
+inline void ToHex(const uint8_t* bytes, std::size_t count, char* out)
+{
+    static const char digits[] = "0123456789ABCDEF";
+    for (std::size_t i = 0; i < count; ++i) {
+        const uint8_t complemented = static_cast<uint8_t>(~bytes[i]);
+        out[2 * i] = digits[complemented >> 4];
+        out[2 * i + 1] = digits[complemented & 0x0F];
+    }
+    out[2 * count] = '\0';
+}
+
+inline int HexValue(char c)
+{
+    return c <= '9' ? c - '0' : (c & ~0x20) - 'A' + 10;
+}
+
+inline void FromHex(const char* text, std::size_t count, uint8_t* bytes)
+{
+    for (std::size_t i = 0; i < count; ++i)
+        bytes[i] = static_cast<uint8_t>(~(HexValue(text[2 * i]) << 4 | HexValue(text[2 * i + 1])));
 }
 
 // Ticks of the time-stamp counter per second, measured once.

@@ -1,5 +1,5 @@
 // The library's engine and text form. Peers with a standard Twofish run in
-// the same executable (nettle_cipher_bench.cpp, botan_cipher_bench.cpp).
+// the same executable (one file each).
 #include <cstring>
 
 #include "cipher_bench.h"
@@ -18,39 +18,26 @@ void KeyFromBytes(keyInstance& key, int bits, unsigned char direction)
         std::memcpy(&key.key32[i], Key256() + 4 * i, 4);
 }
 
-void BM_Tessaline_EcbEncrypt(benchmark::State& state)
+void EcbBench(benchmark::State& state, unsigned char direction)
 {
     keyInstance key;
-    KeyFromBytes(key, 128, DIR_ENCRYPT);
+    KeyFromBytes(key, 128, direction);
     reKey(&key);
     cipherInstance cipher;
     cipherInit(&cipher, MODE_ECB, nullptr);
     std::vector<uint8_t> in = Input(kEcbBytes), out(kEcbBytes);
+    const int bits = static_cast<int>(kEcbBytes * 8);
     MeasureThroughput(state, kEcbBytes, [&] {
-        blockEncrypt(&cipher, &key, in.data(), static_cast<int>(kEcbBytes * 8), out.data());
+        if (direction == DIR_ENCRYPT)
+            blockEncrypt(&cipher, &key, in.data(), bits, out.data());
+        else
+            blockDecrypt(&cipher, &key, in.data(), bits, out.data());
         benchmark::DoNotOptimize(out.data());
     });
 }
-BENCHMARK(BM_Tessaline_EcbEncrypt)->Unit(benchmark::kMillisecond);
 
-void BM_Tessaline_EcbDecrypt(benchmark::State& state)
+void KeySetupBench(benchmark::State& state, int bits)
 {
-    keyInstance key;
-    KeyFromBytes(key, 128, DIR_DECRYPT);
-    reKey(&key);
-    cipherInstance cipher;
-    cipherInit(&cipher, MODE_ECB, nullptr);
-    std::vector<uint8_t> in = Input(kEcbBytes), out(kEcbBytes);
-    MeasureThroughput(state, kEcbBytes, [&] {
-        blockDecrypt(&cipher, &key, in.data(), static_cast<int>(kEcbBytes * 8), out.data());
-        benchmark::DoNotOptimize(out.data());
-    });
-}
-BENCHMARK(BM_Tessaline_EcbDecrypt)->Unit(benchmark::kMillisecond);
-
-void BM_Tessaline_ReKey(benchmark::State& state)
-{
-    const int bits = static_cast<int>(state.range(0));
     keyInstance key;
     KeyFromBytes(key, bits, DIR_ENCRYPT);
     for (auto _ : state) {
@@ -58,22 +45,40 @@ void BM_Tessaline_ReKey(benchmark::State& state)
         benchmark::DoNotOptimize(key.sBox8x32);
     }
 }
-BENCHMARK(BM_Tessaline_ReKey)->Arg(128)->Arg(256);
 
-void BM_Tessaline_RvEncryptDecrypt64(benchmark::State& state)
+void TextEncryptBench(benchmark::State& state)
 {
-    std::vector<uint8_t> value = Input(64);
+    std::vector<uint8_t> value = Input(kTextBytes);
     char text[5 * 32 + 5];
-    unsigned char out[64];
     for (auto _ : state) {
         rvEncrypt(value.data(), value.size(), text);
+        benchmark::DoNotOptimize(text);
+    }
+}
+
+void TextDecryptBench(benchmark::State& state)
+{
+    std::vector<uint8_t> value = Input(kTextBytes);
+    char text[5 * 32 + 5];
+    rvEncrypt(value.data(), value.size(), text);
+    unsigned char out[kTextBytes];
+    for (auto _ : state) {
         unsigned long length = sizeof out;
         rvDecrypt(text, out, &length, nullptr);
         benchmark::DoNotOptimize(out);
     }
 }
-BENCHMARK(BM_Tessaline_RvEncryptDecrypt64);
+
+[[maybe_unused]] const bool registered = [] {
+    bench::Register("crypt_ecb_encrypt", "tessaline", kEcbSize, EcbBench, DIR_ENCRYPT)
+        ->Unit(benchmark::kMillisecond);
+    bench::Register("crypt_ecb_decrypt", "tessaline", kEcbSize, EcbBench, DIR_DECRYPT)
+        ->Unit(benchmark::kMillisecond);
+    bench::Register("crypt_key_setup", "tessaline", "128", KeySetupBench, 128);
+    bench::Register("crypt_key_setup", "tessaline", "256", KeySetupBench, 256);
+    bench::Register("crypt_text_encrypt", "tessaline", kTextSize, TextEncryptBench);
+    bench::Register("crypt_text_decrypt", "tessaline", kTextSize, TextDecryptBench);
+    return true;
+}();
 
 }  // namespace
-
-BENCHMARK_MAIN();

@@ -3,6 +3,7 @@
 #include "crypt/text_cipher.h"
 
 #include <climits>
+#include <cstddef>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
@@ -70,6 +71,21 @@ int hexDigitValue(char c)
     return -1;
 }
 
+// A group of eight hex digits, as strtoul in base 16 reads it. Plain digits,
+// the usual case, are converted here; anything else (a sign, blanks, a "0x",
+// a short or bad group) goes to strtoul itself.
+uint32_t keyGroupValue(const char* group)
+{
+    uint32_t value = 0;
+    for (std::size_t d = 0; d < kKeyGroupDigits; ++d) {
+        const int digit = hexDigitValue(group[d]);
+        if (digit < 0)
+            return static_cast<uint32_t>(std::strtoul(group, nullptr, 16));
+        value = value << 4 | static_cast<uint32_t>(digit);
+    }
+    return value;
+}
+
 }  // namespace
 
 int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char direction, char* keyText,
@@ -77,7 +93,10 @@ int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char dire
 {
     if (key == nullptr || cipher == nullptr || keyText == nullptr)
         return 0;
-    std::memset(key, 0, sizeof *key);
+    // reKey below fills the whole S-box tables for these sizes, so clearing
+    // them first would be 4 KiB of writes for nothing.
+    const bool sBoxesFilled = keyBits == 128 || keyBits == 192 || keyBits == 256;
+    std::memset(key, 0, sBoxesFilled ? offsetof(keyInstance, sBox8x32) : sizeof *key);
     std::memset(cipher, 0, sizeof *cipher);
     if (makeKey(key, direction, keyBits, nullptr) != TRUE)
         return 0;
@@ -91,7 +110,7 @@ int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char dire
         char group[kKeyGroupDigits + 1] = {};
         for (std::size_t d = 0; d < kKeyGroupDigits && *digits != '\0'; ++d)
             group[d] = *digits++;
-        key->key32[i] = static_cast<uint32_t>(std::strtoul(group, nullptr, 16));
+        key->key32[i] = keyGroupValue(group);
     }
     reKey(key);
     return 1;

@@ -146,24 +146,42 @@ TESSALINE_ALWAYS_INLINE void cipherLanes(const uint32_t* s, const uint32_t* k, i
         decryptLanes<Lanes>(s, k, rounds, b);
 }
 
-// Electronic code book: blocks are independent, so they go four at a time.
+// `Lanes` consecutive blocks in one pass.
+template <Direction D, int Lanes>
+TESSALINE_ALWAYS_INLINE void runLanes(const uint32_t* s, const uint32_t* k, int rounds,
+                                      const unsigned char* in, unsigned char* out)
+{
+    Block b[Lanes];
+    for (int l = 0; l < Lanes; ++l)
+        b[l] = loadBlock(in + l * kBlockBytes);
+    cipherLanes<D, Lanes>(s, k, rounds, b);
+    for (int l = 0; l < Lanes; ++l)
+        storeBlock(out + l * kBlockBytes, b[l]);
+}
+
+// Electronic code book: blocks are independent, so they go four at a time,
+// and the last one to three together.
 template <Direction D>
 TESSALINE_ALWAYS_INLINE void runCodeBook(const uint32_t* s, const uint32_t* k, int rounds, long blocks,
                                          const unsigned char* in, unsigned char* out)
 {
     constexpr int kLanes = 4;
-    for (; blocks >= kLanes; blocks -= kLanes, in += kLanes * kBlockBytes, out += kLanes * kBlockBytes) {
-        Block b[kLanes];
-        for (int l = 0; l < kLanes; ++l)
-            b[l] = loadBlock(in + l * kBlockBytes);
-        cipherLanes<D, kLanes>(s, k, rounds, b);
-        for (int l = 0; l < kLanes; ++l)
-            storeBlock(out + l * kBlockBytes, b[l]);
+    // One block left alone would run at the latency of a single chain: the
+    // last five go as three and two instead.
+    const long tail = blocks % kLanes == 1 && blocks > kLanes ? kLanes + 1 : blocks % kLanes;
+    for (; blocks > tail; blocks -= kLanes, in += kLanes * kBlockBytes, out += kLanes * kBlockBytes)
+        runLanes<D, kLanes>(s, k, rounds, in, out);
+    if (blocks == kLanes + 1) {
+        runLanes<D, 3>(s, k, rounds, in, out);
+        blocks -= 3;
+        in += 3 * kBlockBytes;
+        out += 3 * kBlockBytes;
     }
-    for (; blocks > 0; --blocks, in += kBlockBytes, out += kBlockBytes) {
-        Block b = loadBlock(in);
-        cipherLanes<D, 1>(s, k, rounds, &b);
-        storeBlock(out, b);
+    switch (blocks) {
+    case 3: runLanes<D, 3>(s, k, rounds, in, out); break;
+    case 2: runLanes<D, 2>(s, k, rounds, in, out); break;
+    case 1: runLanes<D, 1>(s, k, rounds, in, out); break;
+    default: break;
     }
 }
 

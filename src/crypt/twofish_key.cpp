@@ -42,12 +42,16 @@ uint32_t h(uint32_t input, const uint32_t* keyWords)
     return result;
 }
 
-uint32_t hForWords(int words, uint32_t input, const uint32_t* keyWords)
+// The subkeys, with h specialised for the number of key words so that its
+// stages unroll.
+template <int Words>
+void fillSubkeys(keyInstance* key, int pairs, const uint32_t* evenWords, const uint32_t* oddWords)
 {
-    switch (words) {
-    case 4: return h<4>(input, keyWords);
-    case 3: return h<3>(input, keyWords);
-    default: return h<2>(input, keyWords);
+    for (int i = 0; i < pairs; ++i) {
+        const uint32_t a = h<Words>(i * kSubkeyStep, evenWords);
+        const uint32_t b = rotateLeft(h<Words>(i * kSubkeyStep + kSubkeyOdd, oddWords), 8);
+        key->subKeys[2 * i] = a + b;
+        key->subKeys[2 * i + 1] = rotateLeft(a + 2 * b, 9);
     }
 }
 
@@ -117,11 +121,10 @@ int reKey(keyInstance* key)
 
     const int hWords = pairs < 2 ? 2 : pairs;
     const int subkeyPairs = kWhiteningWords / 2 + roundsOf(key);
-    for (int i = 0; i < subkeyPairs; ++i) {
-        const uint32_t a = hForWords(hWords, i * kSubkeyStep, evenWords);
-        const uint32_t b = rotateLeft(hForWords(hWords, i * kSubkeyStep + kSubkeyOdd, oddWords), 8);
-        key->subKeys[2 * i] = a + b;
-        key->subKeys[2 * i + 1] = rotateLeft(a + 2 * b, 9);
+    switch (hWords) {
+    case 4: fillSubkeys<4>(key, subkeyPairs, evenWords, oddWords); break;
+    case 3: fillSubkeys<3>(key, subkeyPairs, evenWords, oddWords); break;
+    default: fillSubkeys<2>(key, subkeyPairs, evenWords, oddWords); break;
     }
 
     switch (key->keyLen) {

@@ -85,8 +85,10 @@ int rvDirIterator_rep::get_next()
         if (entry == nullptr) {
             return 0;
         }
-        CopyEntry(entry, m_entry);
-        if (fnmatch(pattern, m_entry->d_name, FNM_PATHNAME) == 0) {
+        // Matched where readdir left it, so that only the entries delivered
+        // pay for the copy into the shared buffer.
+        if (fnmatch(pattern, entry->d_name, FNM_PATHNAME) == 0) {
+            CopyEntry(entry, m_entry);
             return 1;
         }
     }

@@ -41,10 +41,24 @@ int finish(int result, int* err)
     return result == 0 ? 0 : CHECK_SYSERROR(result);
 }
 
-// Lock and Try of the checked and recursive types.
+void setRecord(MMutex& mutex, unsigned long owner, int count, int held)
+{
+    mutex.m_owner = owner;
+    mutex.m_count = count;
+    mutex.m_held = held;
+    tessaline::storeRelaxed(mutex.m_locked, held);
+}
+
+// Lock and Try of the checked and recursive types. A free mutex is taken
+// with trylock inside the same guard section that reads the record, so the
+// uncontended case costs one guard round instead of two; trylock never
+// blocks, so holding m_guard across it keeps the lock order. Only when the
+// platform mutex is taken does the caller leave the guard and block on it.
+// The record still changes only after the platform mutex is held.
 int lockTracked(MMutex& mutex, int* err, bool blocking)
 {
     const unsigned long self = pthread_self();
+    int result;
     {
         GuardLock guard(mutex.m_guard);
         if (mutex.m_held == 1) {
@@ -58,13 +72,17 @@ int lockTracked(MMutex& mutex, int* err, bool blocking)
                 return 0;
             }
         }
+        result = pthread_mutex_trylock(&mutex.m_mutex);
+        if (result == 0)
+            setRecord(mutex, self, 1, 1);
     }
-    // The only blocking step; m_guard is not held across it.
-    const int result =
-        record(mutex, blocking ? pthread_mutex_lock(&mutex.m_mutex) : pthread_mutex_trylock(&mutex.m_mutex));
-    if (result == 0) {
-        tessaline::writeRecord(mutex, MutexRecord{self, 1, 1});
+    if (result != 0 && blocking) {
+        // The only blocking step; m_guard is not held across it.
+        result = pthread_mutex_lock(&mutex.m_mutex);
+        if (result == 0)
+            tessaline::writeRecord(mutex, MutexRecord{self, 1, 1});
     }
+    record(mutex, result);
     return finish(result, err);
 }
 
@@ -81,10 +99,7 @@ MutexRecord readRecord(MMutex& mutex)
 void writeRecord(MMutex& mutex, const MutexRecord& record)
 {
     GuardLock guard(mutex.m_guard);
-    mutex.m_owner = record.owner;
-    mutex.m_count = record.count;
-    mutex.m_held = record.held;
-    storeRelaxed(mutex.m_locked, record.held);
+    setRecord(mutex, record.owner, record.count, record.held);
 }
 
 }  // namespace tessaline
