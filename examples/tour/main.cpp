@@ -11,5 +11,6 @@ int main()
     TourFiles();
     TourCrypt();
     TourThread();
+    TourTree();
     return 0;
 }

@@ -7,5 +7,6 @@ void TourConfig();
 void TourFiles();
 void TourCrypt();
 void TourThread();
+void TourTree();
 
 #endif

@@ -1,21 +1,59 @@
+// The real platform calls behind the file services' seam.
 #include "files/sys.h"
 
 #include <dlfcn.h>
 #include <errno.h>
+#include <fcntl.h>
 #include <stdlib.h>
 #include <unistd.h>
 
-namespace tessaline::files::sys {
+namespace tessaline::files {
+namespace {
 
-int Stat(const char* path, struct stat* info) { return ::stat(path, info); }
+int OpenFile(const char* path, int flags, mode_t mode)
+{
+    return ::open(path, flags, mode);
+}
 
-int Access(const char* path, int mode) { return ::access(path, mode); }
+int StatPath(const char* path, struct stat* info)
+{
+    return ::stat(path, info);
+}
 
-int MakeDirectory(const char* path, mode_t mode) { return ::mkdir(path, mode); }
+int StatHandle(int fd, struct stat* info)
+{
+    return ::fstat(fd, info);
+}
 
-char* ResolvePath(const char* path, char* resolved) { return ::realpath(path, resolved); }
+int StatFileSystem(const char* path, struct statfs* info)
+{
+    return ::statfs(path, info);
+}
 
-int FileSystemStatus(const char* path, struct statfs* info) { return ::statfs(path, info); }
+SysCalls g_sys = {
+    OpenFile, ::close, ::read, ::write, ::lseek, StatHandle, StatPath, ::lockf,
+    ::access, ::chmod, ::mkdir, ::unlink, ::rmdir, ::symlink, ::realpath, StatFileSystem,
+    ::nanosleep, ::opendir, ::readdir, ::closedir, ::pathconf,
+};
+
+}  // namespace
+
+SysCalls& Sys()
+{
+    return g_sys;
+}
+
+namespace sys {
+
+int Stat(const char* path, struct stat* info) { return Sys().stat(path, info); }
+
+int Access(const char* path, int mode) { return Sys().access(path, mode); }
+
+int MakeDirectory(const char* path, mode_t mode) { return Sys().mkdir(path, mode); }
+
+char* ResolvePath(const char* path, char* resolved) { return Sys().realpath(path, resolved); }
+
+int FileSystemStatus(const char* path, struct statfs* info) { return Sys().statfs(path, info); }
 
 void* OpenLibrary(const char* name, int mode) { return ::dlopen(name, mode); }
 
@@ -30,4 +68,6 @@ void DiscardLibraryError()
     errno = saved;
 }
 
-}  // namespace tessaline::files::sys
+}  // namespace sys
+
+}  // namespace tessaline::files

@@ -1,14 +1,64 @@
-// The platform calls of the files subsystem. Each returns what the platform
-// call returns and leaves its errno untouched, so callers read the cause of a
-// failure right after the call.
+// The platform calls of the files subsystem, routed through one table so
+// that tests can make any of them fail on demand. The library reads the table
+// on every call; tests swap entries under a ScopedSysCalls and the old table
+// comes back when it goes out of scope. Not part of the installed interface.
+//
+// Each call returns what the platform call returns and leaves its errno
+// untouched, so callers read the cause of a failure right after the call.
 #ifndef TESSALINE_SRC_FILES_SYS_H
 #define TESSALINE_SRC_FILES_SYS_H
 
+#include <dirent.h>
 #include <sys/stat.h>
 #include <sys/types.h>
 #include <sys/vfs.h>
+#include <time.h>
 
-namespace tessaline::files::sys {
+
+namespace tessaline::files {
+
+struct SysCalls {
+    int (*open)(const char* path, int flags, mode_t mode);
+    int (*close)(int fd);
+    ssize_t (*read)(int fd, void* buffer, size_t count);
+    ssize_t (*write)(int fd, const void* buffer, size_t count);
+    off_t (*lseek)(int fd, off_t offset, int whence);
+    int (*fstat)(int fd, struct stat* info);
+    int (*stat)(const char* path, struct stat* info);
+    int (*lockf)(int fd, int command, off_t length);
+    int (*access)(const char* path, int mode);
+    int (*chmod)(const char* path, mode_t mode);
+    int (*mkdir)(const char* path, mode_t mode);
+    int (*unlink)(const char* path);
+    int (*rmdir)(const char* path);
+    int (*symlink)(const char* existing, const char* created);
+    // realpath into a caller's area of PATH_MAX bytes.
+    char* (*realpath)(const char* path, char* resolved);
+    int (*statfs)(const char* path, struct statfs* info);
+    int (*nanosleep)(const struct timespec* pause, struct timespec* left);
+    DIR* (*opendir)(const char* path);
+    struct dirent* (*readdir)(DIR* dir);
+    int (*closedir)(DIR* dir);
+    long (*pathconf)(const char* path, int name);
+};
+
+// The live table. Tests reach it by linking the library's objects
+// statically; the shared object does not export it.
+SysCalls& Sys();
+
+// Restores the table as it was at construction.
+class ScopedSysCalls {
+public:
+    ScopedSysCalls() : m_saved(Sys()) {}
+    ~ScopedSysCalls() { Sys() = m_saved; }
+    ScopedSysCalls(const ScopedSysCalls&) = delete;
+    ScopedSysCalls& operator=(const ScopedSysCalls&) = delete;
+
+private:
+    SysCalls m_saved;
+};
+
+namespace sys {
 
 int Stat(const char* path, struct stat* info);
 int Access(const char* path, int mode);
@@ -23,6 +73,8 @@ void* LibrarySymbol(void* handle, const char* symbol);
 // Clears the loader's pending message, keeping errno.
 void DiscardLibraryError();
 
-}  // namespace tessaline::files::sys
+}  // namespace sys
+
+}  // namespace tessaline::files
 
 #endif

@@ -1,0 +1,204 @@
+#include <cerrno>
+#include <string>
+
+#include <sys/stat.h>
+#include <unistd.h>
+#include <utime.h>
+
+#include <gtest/gtest.h>
+
+#include "files/file_fixtures.h"
+#include "files/sys.h"
+#include "support/temp_dir.h"
+#include "tessaline/files/rvCopy.h"
+
+using namespace tessaline::test;
+using tessaline::files::ScopedSysCalls;
+using tessaline::files::Sys;
+
+namespace {
+
+int Copy(const std::string& source, const std::string& target, unsigned recurse,
+         unsigned overwrite, unsigned link = 0, unsigned move = 0)
+{
+    return rvCopyFile(source.c_str(), target.c_str(), recurse, overwrite, link, move, nullptr,
+                      nullptr, 0640);
+}
+
+void SetTime(const std::string& path, time_t when)
+{
+    const struct utimbuf times = {when, when};
+    utime(path.c_str(), &times);
+}
+
+std::string LinkText(const std::string& path)
+{
+    char text[4096] = {};
+    return readlink(path.c_str(), text, sizeof text - 1) > 0 ? text : "<no link>";
+}
+
+// Four files, one of them two levels down with a newline in its name.
+void MakeSourceTree(const TempDir& dir)
+{
+    Put(dir / "src/one.txt", "one");
+    Put(dir / "src/two.dat", "second");
+    Put(dir / "src/sub/three.txt", "three");
+    Put(dir / "src/sub/deep/four\nname", "4");
+}
+
+}  // namespace
+
+TEST(CopyFile, SingleFile)
+{
+    TempDir dir;
+    const std::string source = Put(dir / "source.txt", std::string(40000, 'p'));
+    const mode_t oldMask = umask(022);
+    EXPECT_EQ(1, Copy(source, dir / "new/dir/copy.txt", 0, 1)) << "parents are made";
+    EXPECT_EQ(Slurp(source), Slurp(dir / "new/dir/copy.txt"));
+    struct stat info;
+    stat((dir / "new/dir/copy.txt").c_str(), &info);
+    EXPECT_EQ(0640u, info.st_mode & 07777);
+    umask(oldMask);
+
+    EXPECT_EQ(1, Copy(Put(dir / "empty", ""), dir / "empty.copy", 0, 1));
+    EXPECT_EQ("", Slurp(dir / "empty.copy"));
+    EXPECT_EQ(0, Copy(dir / "missing", dir / "made/x", 0, 1));
+    EXPECT_FALSE(Exists(dir / "made")) << "a missing source makes nothing";
+    EXPECT_EQ(0, Copy(source, dir.path(), 0, 1)) << "a directory is no single-way target";
+    EXPECT_EQ(0, Copy(source, "copy.txt", 0, 1)) << "a bare name has no directory to make";
+    EXPECT_FALSE(Exists("copy.txt"));
+}
+
+TEST(CopyFile, OverwriteRules)
+{
+    TempDir dir;
+    const std::string source = Put(dir / "source", "new!");
+    const std::string target = Put(dir / "target", "old.");
+    SetTime(source, 1000000);
+    SetTime(target, 1000000);
+    EXPECT_EQ(0, Copy(source, target, 0, 0)) << "same time and size count as up to date";
+    EXPECT_EQ("old.", Slurp(target));
+    SetTime(target, 2000000);
+    EXPECT_EQ(1, Copy(source, target, 0, 0));
+    EXPECT_EQ("new!", Slurp(target));
+
+    EXPECT_EQ(1, Copy(source, dir / "fresh", 0, 0)) << "created exclusively";
+    Put(dir / "longer", "longer old content");
+    EXPECT_EQ(1, Copy(source, dir / "longer", 0, 2)) << "2 truncates";
+    EXPECT_EQ("new!", Slurp(dir / "longer"));
+    ScopedSysCalls restore;
+    Sys().nanosleep = [](const struct timespec*, struct timespec*) { return 0; };
+    EXPECT_EQ(0, Copy(source, dir / "nodir/x", 0, 2)) << "but makes no directories";
+    EXPECT_FALSE(Exists(dir / "nodir"));
+}
+
+TEST(CopyFile, OntoItselfLeavesTheFileAlone)
+{
+    TempDir dir;
+    const std::string source = Put(dir / "d/self", "precious");
+    link(source.c_str(), (dir / "hard").c_str());
+    symlink(source.c_str(), (dir / "soft").c_str());
+    for (const std::string& target : {source, dir / "d/./self", dir / "hard", dir / "soft"}) {
+        SCOPED_TRACE(target);
+        EXPECT_EQ(0, Copy(source, target, 0, 1));
+        EXPECT_EQ("precious", Slurp(source));
+    }
+    EXPECT_EQ(0, Copy(dir / "d/*", dir / "d", 0, 1));
+    EXPECT_EQ("precious", Slurp(source));
+}
+
+TEST(CopyFile, FailedCopyRemovesTheTargetAndKeepsTheSource)
+{
+    TempDir dir;
+    const std::string source = Put(dir / "source", std::string(50000, 's'));
+    const std::string target = dir / "target";
+    static int calls;
+    static const auto realRead = Sys().read;
+    static const auto realClose = Sys().close;
+    const struct {
+        const char* what;
+        void (*breakIt)();
+    } cases[] = {
+        {"the source ends early",
+         [] {
+             Sys().read = [](int fd, void* buffer, size_t count) -> ssize_t {
+                 return ++calls == 2 ? 0 : realRead(fd, buffer, count);
+             };
+         }},
+        {"a write fails",
+         [] { Sys().write = [](int, const void*, size_t) -> ssize_t { return -1; }; }},
+        {"the target fails to close",
+         [] {
+             Sys().close = [](int fd) {
+                 realClose(fd);
+                 return ++calls == 2 ? -1 : 0;  // the source closes first
+             };
+         }},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.what);
+        Put(target, "older target");
+        ScopedSysCalls restore;
+        calls = 0;
+        c.breakIt();
+        EXPECT_EQ(0, Copy(source, target, 0, 1, 0, 1));
+        EXPECT_FALSE(Exists(target));
+        EXPECT_EQ(50000u, Slurp(source).size());
+    }
+}
+
+TEST(CopyFile, LinksMovesAndRefusedSchemes)
+{
+    TempDir dir;
+    const std::string source = Put(dir / "source", "text");
+    EXPECT_EQ(1, Copy(source, dir / "link", 0, 1, 1));
+    EXPECT_EQ(source, LinkText(dir / "link"));
+    EXPECT_EQ(0, Copy(source, dir / "link", 0, 1, 1)) << "an existing target fails";
+
+    MakeSourceTree(dir);
+    EXPECT_EQ(1, Copy(dir / "src/*", dir / "dirlink/", 0, 1, 1)) << "one link for the directory";
+    EXPECT_EQ(dir / "src", LinkText(dir / "dirlink"));
+    // Without the slash the directory link is tried on the parent, fails, and
+    // the files are linked one by one.
+    EXPECT_EQ(2, Copy(dir / "src/*", dir / "links", 0, 1, 1));
+    EXPECT_EQ(dir / "src/two.dat", LinkText(dir / "links/two.dat"));
+
+    EXPECT_EQ(4, Copy(dir / "src", dir / "moved", 1, 1, 0, 1));
+    EXPECT_EQ("4", Slurp(dir / "moved/sub/deep/four\nname"));
+    EXPECT_TRUE(Exists(dir / "src/sub/deep")) << "source directories stay";
+    EXPECT_FALSE(Exists(dir / "src/sub/deep/four\nname"));
+
+    Put(dir / "ftp:/host/a.txt", "remote?");
+    Put(dir / "HTTP:/host/a.txt", "remote?");
+    Put(dir / "file:/host/a.txt", "local");
+    ScopedCwd cwd(dir.path());
+    EXPECT_EQ(0, Copy("ftp://host/a.txt", "./out", 0, 1));
+    EXPECT_EQ(0, Copy("HTTP://host/a.txt", "./out", 0, 1));
+    EXPECT_FALSE(Exists("out"));
+    EXPECT_EQ(1, Copy("file://host/a.txt", "./out", 0, 1));
+}
+
+TEST(CopyFile, WildcardsAndTrees)
+{
+    TempDir dir;
+    MakeSourceTree(dir);
+    EXPECT_EQ(1, Copy(dir / "src/*.txt", dir / "texts", 0, 1));
+    EXPECT_EQ(2, Copy(dir / "src", dir / "flat", 0, 1)) << "recurse 0 skips directories";
+    EXPECT_FALSE(Exists(dir / "flat/sub"));
+    EXPECT_EQ(4, Copy(dir / "src/", dir / "full", 1, 1));
+    EXPECT_EQ("4", Slurp(dir / "full/sub/deep/four\nname"));
+    EXPECT_EQ(0, Copy(dir / "src/*.none", dir / "nomatch", 0, 1));
+    EXPECT_TRUE(Exists(dir / "nomatch")) << "the target directory is made anyway";
+
+    Put(dir / "file", "x");
+    symlink((dir / "gone").c_str(), (dir / "dangling").c_str());
+    for (const std::string& bad : {dir / "file/inner", dir / "dangling", dir / "missing/*"}) {
+        EXPECT_EQ(0, Copy(bad, dir / "out", 1, 1)) << bad;
+    }
+    EXPECT_EQ(0, Copy(dir / "file", dir / "file/inner", 0, 1)) << "a target through a file";
+    EXPECT_EQ(0, rvCopyFile(nullptr, "x", 0, 1, 0, 0, nullptr, nullptr, 0644));
+
+    ScopedCwd cwd(dir.path());
+    EXPECT_EQ(0, Copy("src", dir / "bare", 1, 1)) << "a bare directory name walks nothing";
+    EXPECT_EQ(4, Copy("./src", dir / "dotted", 1, 1));
+}

@@ -1,0 +1,58 @@
+// Small helpers for the file tests, beside support/temp_dir.h.
+#ifndef TESSALINE_TESTS_FILES_FILE_FIXTURES_H
+#define TESSALINE_TESTS_FILES_FILE_FIXTURES_H
+
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <string>
+#include <system_error>
+
+#include <sys/stat.h>
+
+namespace tessaline::test {
+
+// Writes `content` to `path`, making its directories first; returns `path`.
+inline std::string Put(const std::string& path, const std::string& content)
+{
+    std::filesystem::create_directories(std::filesystem::path(path).parent_path());
+    std::ofstream(path, std::ios::binary) << content;
+    return path;
+}
+
+// The whole file, or "<missing>".
+inline std::string Slurp(const std::string& path)
+{
+    std::ifstream in(path, std::ios::binary);
+    return in ? std::string(std::istreambuf_iterator<char>(in), {}) : "<missing>";
+}
+
+// Also true for a dangling symbolic link.
+inline bool Exists(const std::string& path)
+{
+    struct stat info;
+    return lstat(path.c_str(), &info) == 0;
+}
+
+// Works in `directory` while the object lives.
+class ScopedCwd {
+public:
+    explicit ScopedCwd(const std::string& directory) : m_saved(std::filesystem::current_path())
+    {
+        std::filesystem::current_path(directory);
+    }
+    ~ScopedCwd()
+    {
+        std::error_code ignored;
+        std::filesystem::current_path(m_saved, ignored);
+    }
+    ScopedCwd(const ScopedCwd&) = delete;
+    ScopedCwd& operator=(const ScopedCwd&) = delete;
+
+private:
+    std::filesystem::path m_saved;
+};
+
+}  // namespace tessaline::test
+
+#endif
