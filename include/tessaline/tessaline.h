@@ -1,5 +1,6 @@
-/*
- * Tessaline: the whole interface in one include.
+/**
+ * @file
+ * @brief Tessaline: the whole interface in one include.
  *
  * Subsystems: configuration store (config), paths and file services
  * (files), text encryption (crypt), threads (thread), and text, numbers and
@@ -21,5 +22,6 @@
 #include "tessaline/files/rvFilename.h"
 #include "tessaline/files/rvPath.h"
 #include "tessaline/files/rvSharedLib.h"
+#include "tessaline/config/rvConfig.h"
 
 #endif

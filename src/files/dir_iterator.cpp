@@ -120,7 +120,9 @@ rvDirIterator::~rvDirIterator()
     LetGo(m_rep);
 }
 
-rvDirIterator& rvDirIterator::operator=(const rvDirIterator& other)
+// Taking the new reference before letting go of the old one makes
+// self-assignment safe.
+rvDirIterator& rvDirIterator::operator=(const rvDirIterator& other)  // NOLINT(bugprone-unhandled-self-assignment,cert-oop54-cpp)
 {
     rvDirIterator_rep* rep = other.m_rep;
     const char* name = other.m_name;

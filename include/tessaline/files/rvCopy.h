@@ -1,22 +1,23 @@
-// Copying, linking, moving, removing and comparing files, wildcards and
-// directory trees, and the size of a file.
-//
-// All functions return plain counts or flags and throw nothing of their own;
-// the cause of a failure, where there is one, is left in errno. They go on
-// past a failed member of a wildcard or tree and count what succeeded, so a
-// result of 0 may mean failure, nothing to do or nothing found: callers that
-// care compare the count with what they expect. Only rvUnlink prints, one
-// line for a file it cannot remove.
-//
-// Names are taken apart by rvFilename: a directory text without "/" (a bare
-// "data") has no directory part and walks nothing; write "./data". Entries
-// whose names hold "*" or "?" are themselves taken as patterns when a tree is
-// copied or removed.
-//
-// Thread safety: no locks and no shared state; calls on separate trees are
-// independent. A tree that changes during a walk gives what the platform's
-// directory reading delivers. Recursion depth follows the depth of the tree,
-// with a 16 KiB copy buffer on the stack of each level.
+/// @file
+/// @brief Copying, linking, moving, removing and comparing files, wildcards
+/// and directory trees, and the size of a file.
+///
+/// All functions return plain counts or flags and throw nothing of their own;
+/// the cause of a failure, where there is one, is left in errno. They go on
+/// past a failed member of a wildcard or tree and count what succeeded, so a
+/// result of 0 may mean failure, nothing to do or nothing found: callers that
+/// care compare the count with what they expect. Only rvUnlink prints, one
+/// line for a file it cannot remove.
+///
+/// Names are taken apart by rvFilename: a directory text without "/" (a bare
+/// "data") has no directory part and walks nothing; write "./data". Entries
+/// whose names hold "*" or "?" are themselves taken as patterns when a tree is
+/// copied or removed.
+///
+/// Thread safety: no locks and no shared state; calls on separate trees are
+/// independent. A tree that changes during a walk gives what the platform's
+/// directory reading delivers. Recursion depth follows the depth of the tree,
+/// with a 16 KiB copy buffer on the stack of each level.
 #ifndef TESSALINE_FILES_RVCOPY_H
 #define TESSALINE_FILES_RVCOPY_H
 
@@ -24,70 +25,70 @@
 
 #include "tessaline/util/export.h"
 
-// Copies `source` to `target` and returns the number of files copied (a link
-// made counts as one).
-//
-// `source` is a file, a directory, or a path whose last part holds "*" or
-// "?". For a file, `target` is the file to write, never the directory to put
-// it in: an existing directory as `target` fails. For a wildcard or a
-// directory, `target` is the directory to fill; it is created with its
-// parents, and every match is copied into it under its own name (or, when
-// `target` exists as a file, onto that one file in turn). A directory copies
-// its whole content as the pattern "dir/*".
-//
-// `recurse` 0 skips directories among the matches, non-zero copies them as
-// trees. `overwrite` 1 replaces the target in any case and makes its missing
-// directories; 0 replaces it only if its modification time or size differs
-// from the source (equal ones count as up to date and return 0, whatever the
-// contents), creates a missing target exclusively, and makes no directories;
-// any other value makes no directories but truncates as 1 does. `link`
-// non-zero makes a symbolic link instead of a copy (for a wildcard, first a
-// link of the whole directory; if that fails, links member by member); an
-// existing target makes it fail. `move` non-zero removes each source file
-// after its copy; source directories stay. `aux1` and `aux2` are handed to
-// the recursive calls and not read. `mode` is the permission of a target the
-// call creates, under the umask; an existing target keeps its mode. Nothing
-// else (time, owner) travels.
-//
-// Sources with the scheme "ftp" or "http" in any letter case are refused.
-// A null `source` or `target` copies nothing.
-//
-// Choices where the classic behaviour was open, made so that no data is lost:
-// - A copy onto the source itself (the same device and inode, also through
-//   another name, a hard link or a symbolic link) returns 0 and leaves the
-//   file untouched.
-// - A source that ends before its size was copied (it shrank during the
-//   copy), a short write that cannot be completed, or a target that fails to
-//   close fails the copy.
-// A failed copy removes the target it opened, even an older one it
-// truncated, and never removes the source.
+/// Copies `source` to `target` and returns the number of files copied (a link
+/// made counts as one).
+///
+/// `source` is a file, a directory, or a path whose last part holds "*" or
+/// "?". For a file, `target` is the file to write, never the directory to put
+/// it in: an existing directory as `target` fails. For a wildcard or a
+/// directory, `target` is the directory to fill; it is created with its
+/// parents, and every match is copied into it under its own name (or, when
+/// `target` exists as a file, onto that one file in turn). A directory copies
+/// its whole content as the pattern "dir/*".
+///
+/// `recurse` 0 skips directories among the matches, non-zero copies them as
+/// trees. `overwrite` 1 replaces the target in any case and makes its missing
+/// directories; 0 replaces it only if its modification time or size differs
+/// from the source (equal ones count as up to date and return 0, whatever the
+/// contents), creates a missing target exclusively, and makes no directories;
+/// any other value makes no directories but truncates as 1 does. `link`
+/// non-zero makes a symbolic link instead of a copy (for a wildcard, first a
+/// link of the whole directory; if that fails, links member by member); an
+/// existing target makes it fail. `move` non-zero removes each source file
+/// after its copy; source directories stay. `aux1` and `aux2` are handed to
+/// the recursive calls and not read. `mode` is the permission of a target the
+/// call creates, under the umask; an existing target keeps its mode. Nothing
+/// else (time, owner) travels.
+///
+/// Sources with the scheme "ftp" or "http" in any letter case are refused.
+/// A null `source` or `target` copies nothing.
+///
+/// Choices where the classic behaviour was open, made so that no data is lost:
+/// - A copy onto the source itself (the same device and inode, also through
+///   another name, a hard link or a symbolic link) returns 0 and leaves the
+///   file untouched.
+/// - A source that ends before its size was copied (it shrank during the
+///   copy), a short write that cannot be completed, or a target that fails to
+///   close fails the copy.
+/// A failed copy removes the target it opened, even an older one it
+/// truncated, and never removes the source.
 TESSALINE_API int rvCopyFile(const char* source, const char* target, unsigned int recurse,
                              unsigned int overwrite, unsigned int link, unsigned int move,
                              const char* aux1, const char* aux2, unsigned long mode);
 
-// Removes a file, the entries that match a wildcard, or, with `recurse`
-// exactly 1, a directory tree; returns the number of files removed
-// (directories are not counted). A wildcard with `recurse` 0 leaves
-// directories alone. A symbolic link to a directory is removed as a link. A
-// read-only file is made writable first. A file that cannot be removed makes
-// one line on the standard error stream,
-// "rvUnlink: Could not remove <path>: <platform text> (<errno>).", and adds 0;
-// so does a directory given with `recurse` other than 1. Missing paths and
-// directories that stay (not empty) are silent. A dangling symbolic link
-// counts as missing and stays. A null `path` removes nothing.
+/// Removes a file, the entries that match a wildcard, or, with `recurse`
+/// exactly 1, a directory tree; returns the number of files removed
+/// (directories are not counted). A wildcard with `recurse` 0 leaves
+/// directories alone. A symbolic link to a directory is removed as a link. A
+/// read-only file is made writable first. A file that cannot be removed makes
+/// one line on the standard error stream,
+/// "rvUnlink: Could not remove <path>: <platform text> (<errno>).", and adds 0;
+/// so does a directory given with `recurse` other than 1. Missing paths and
+/// directories that stay (not empty) are silent. A dangling symbolic link
+/// counts as missing and stays. A null `path` removes nothing.
 TESSALINE_API int rvUnlink(const char* path, unsigned int recurse);
 
-// 1 when every entry under `first` has an entry of the same name, kind and
-// size under `second`, recursively; else 0. One-way: entries only `second`
-// has do not matter. Contents are never compared. A missing `first` walks
-// nothing and gives 1; a missing `second` gives 0.
+/// 1 when every entry under `first` has an entry of the same name, kind and
+/// size under `second`, recursively; else 0. One-way: entries only `second`
+/// has do not matter. Contents are never compared. A missing `first` walks
+/// nothing and gives 1; a missing `second` gives 0.
 TESSALINE_API int CompareDirectoriesByFileSize(const char* first, const char* second);
 
-// The size of the file `path` names (backslashes accepted, symbolic links
-// followed), or 0 when it cannot be examined.
+/// The size of the file `path` names (backslashes accepted, symbolic links
+/// followed), or 0 when it cannot be examined.
 TESSALINE_API int64_t rvGetFileSize(const char* path);
 
-// The size of an open file, or -1 when the handle cannot be examined.
+/// The size of an open file, or -1 when the handle cannot be examined.
 TESSALINE_API int64_t rvGetFileSize64(void* handle);
 
 #endif

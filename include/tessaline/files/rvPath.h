@@ -1,6 +1,9 @@
-/*
- * File-system queries and directory creation under plain (unmangled) names,
- * callable from C.
+/**
+ * @file
+ * @brief File-system queries and directory creation under plain names.
+ *
+ * The functions keep plain (unmangled) names and are callable from C; this
+ * header also compiles as C.
  *
  * Results are plain return values; nothing is printed. After a failure the
  * cause stays in errno. A null path is treated as the empty name, which
@@ -14,7 +17,7 @@
 
 TESSALINE_EXTERN_C_BEGIN
 
-/*
+/**
  * Creates the directory `path` and any missing parents, the top one first,
  * with mode 06775 under the umask (Linux ignores the set-user-ID bit on
  * directories; set-group-ID follows the parent). Returns 1 when `path` exists
@@ -27,7 +30,7 @@ TESSALINE_EXTERN_C_BEGIN
  */
 TESSALINE_API int CreateDir(const char* path, long extra);
 
-/*
+/**
  * Writes into `out` the absolute name of `path` with links resolved
  * (realpath), cut to `length` - 1 characters, zero-filled to `length` bytes,
  * and returns `out`. A path that cannot be resolved is copied unchanged, cut
@@ -36,10 +39,10 @@ TESSALINE_API int CreateDir(const char* path, long extra);
  */
 TESSALINE_API char* GetFullDirectoryName(const char* path, char* out, unsigned int length);
 
-/* 1 when stat(path) succeeds: a directory exists, a dangling link does not. */
+/** 1 when stat(path) succeeds: a directory exists, a dangling link does not. */
 TESSALINE_API int FileExists(const char* path);
 
-/*
+/**
  * Bytes an unprivileged process may still write on the file system holding
  * `path` (statfs: f_bavail * f_bsize), or 0 when statfs fails, which cannot
  * be told from a full disk. A product beyond the 64-bit range saturates.

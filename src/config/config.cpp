@@ -1,0 +1,221 @@
+// rvConfig: the two-level table, the current and default sections, and the
+// raw lookup and store on which every accessor rests.
+#include <cstring>
+#include <utility>
+
+#include "config/borrowed_name.h"
+#include "config/class_lock.h"
+#include "config/lookup.h"
+#include "tessaline/config/rvConfig.h"
+#include "util/load_time.h"
+
+using tessaline::config::BorrowedName;
+using tessaline::config::ScopedClassLock;
+
+const char* rvConfig::m_szCommentChars = "#;/";
+const char* rvConfig::m_szSectionChars = "[]";
+const char* rvConfig::m_szDelimChars = "=";
+const char* rvConfig::m_szIdString = "# Edited by Tessaline";
+const char* rvConfig::m_szDefaults = "defaults";
+unsigned int rvConfig::m_bBackups = 0;
+MMutex rvConfig::m_mutex TESSALINE_LOAD_TIME(MMutex_::MutexRecursive);
+
+namespace {
+
+// Longest name kept in m_szConfigName; the buffer's last two bytes are never
+// part of it.
+constexpr std::size_t kMaxConfigName = 4094;
+
+}  // namespace
+
+rvConfig::rvConfig()
+    : m_mode(OpenRead),
+      m_nItems(0),
+      m_bModified(0),
+      m_pFile(nullptr),
+      m_bTokenStart(1),
+      m_itToken(nullptr, nullptr),
+      m_szConfigName(),
+      m_strDefaultSection(m_szDefaults)
+{
+    m_itSection = m_sections.end();
+    Section(m_strDefaultSection.c_str(), 1);
+}
+
+rvConfig::rvConfig(const char* path, OpenMode mode)
+    : m_mode(OpenRead),
+      m_nItems(0),
+      m_bModified(0),
+      m_pFile(nullptr),
+      m_bTokenStart(1),
+      m_itToken(nullptr, nullptr),
+      m_szConfigName(),
+      m_strDefaultSection(m_szDefaults)
+{
+    m_itSection = m_sections.end();
+    Load(path, mode);
+}
+
+rvConfig::~rvConfig()
+{
+    Close(0);
+}
+
+void rvConfig::Clear()
+{
+    ScopedClassLock lock;
+    m_sections.clear();
+    m_nItems = 0;
+    m_bModified = 0;
+    m_strDefaultSection = cfgStr(m_szDefaults);
+    m_strSection = cfgStr();
+}
+
+rvConfig::OpenMode rvConfig::Mode()
+{
+    return m_mode;
+}
+
+void rvConfig::Mode(OpenMode mode)
+{
+    m_mode = mode;
+}
+
+const char* rvConfig::ConfigName()
+{
+    return m_szConfigName;
+}
+
+void rvConfig::ConfigName(const char* name)
+{
+    if (name == nullptr) {
+        name = "";
+    }
+    const std::size_t length = strnlen(name, kMaxConfigName);
+    // Load passes ConfigName() back in on a reload.
+    std::memmove(m_szConfigName, name, length);
+    m_szConfigName[length] = '\0';
+}
+
+rvConfig::operator const char*()
+{
+    return ConfigName();
+}
+
+unsigned int rvConfig::Section(const char* name, unsigned int create)
+{
+    cfgStr section(name);
+    if (m_sections.find(section) == m_sections.end()) {
+        if (create == 0) {
+            return 0;
+        }
+        m_sections.insert(SectionTable::value_type(section, KeyTable()));
+        ++m_nItems;
+    }
+    m_strSection = std::move(section);
+    return 1;
+}
+
+const char* rvConfig::Section()
+{
+    return m_strSection.c_str();
+}
+
+void rvConfig::DefaultSection(const char* name)
+{
+    m_strDefaultSection = cfgStr(name);
+}
+
+const char* rvConfig::DefaultSection()
+{
+    return m_strDefaultSection.c_str();
+}
+
+unsigned int rvConfig::IsModified()
+{
+    return m_bModified;
+}
+
+void rvConfig::IsModified(unsigned int flag)
+{
+    m_bModified = flag;
+}
+
+unsigned int rvConfig::IsValid()
+{
+    return m_nItems;
+}
+
+unsigned int tessaline::config::FindValue(rvConfig& config, const rvConfig::cfgStr& key, rvConfig::cfgStr* value,
+                                         const rvConfig::cfgStr& section)
+{
+    ScopedClassLock lock;
+    const rvConfig::cfgStr& name = section.empty() ? config.m_strSection : section;
+    const rvConfig::SectionTable::iterator found = config.m_sections.find(name);
+    if (found == config.m_sections.end()) {
+        return 0;
+    }
+    const rvConfig::KeyTable& keys = found->second;
+    const rvConfig::KeyTable::const_iterator entry = keys.find(key);
+    if (entry == keys.end()) {
+        return 0;
+    }
+    *value = entry->second;
+    return 1;
+}
+
+// The by-value parameters are the interface's fixed signature.
+unsigned int rvConfig::_GetValue(cfgStr key, cfgStr* value, cfgStr section)  // NOLINT(performance-unnecessary-value-param)
+{
+    return tessaline::config::FindValue(*this, key, value, section);
+}
+
+unsigned int rvConfig::_PutValue(cfgStr key, cfgStr value, cfgStr section)  // NOLINT(performance-unnecessary-value-param)
+{
+    ScopedClassLock lock;
+    const cfgStr& name = section.empty() ? m_strSection : section;
+    SectionTable::iterator found = m_sections.find(name);
+    if (found == m_sections.end()) {
+        found = m_sections.insert(SectionTable::value_type(name, KeyTable())).first;
+    }
+    // operator[] grows the table for one more entry even when it replaces.
+    found->second[key] = std::move(value);
+    ++m_nItems;
+    IsModified(1);
+    return 1;
+}
+
+const char* rvConfig::GetValue(const char* key, const char* def, const char* section)
+{
+    cfgStr value;
+    if (tessaline::config::FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) == 0) {
+        return def;
+    }
+    m_strValue = std::move(value);
+    return m_strValue.c_str();
+}
+
+unsigned int rvConfig::PutValue(const char* key, const char* value, const char* section)
+{
+    return _PutValue(cfgStr(key), cfgStr(value), cfgStr(section));
+}
+
+unsigned int rvConfig::CreateBackups()
+{
+    return m_bBackups;
+}
+
+void rvConfig::CreateBackups(unsigned int flag)
+{
+    m_bBackups = flag;
+}
+
+void rvConfig::Lock()
+{
+    m_mutex.Lock(nullptr);
+}
+
+void rvConfig::Unlock()
+{
+    m_mutex.Unlock(nullptr);
+}

@@ -1,0 +1,37 @@
+// What the reading and the writing pass share: the line buffer and the
+// classification of a trimmed line.
+#ifndef TESSALINE_SRC_CONFIG_PASSES_H
+#define TESSALINE_SRC_CONFIG_PASSES_H
+
+#include <cstdio>
+
+#include "tessaline/config/rvConfig.h"
+
+namespace tessaline::config {
+
+constexpr int kLineBufferSize = 4096;
+// The fgets limit: at most 4094 bytes of the file per line.
+constexpr int kLineLimit = 4095;
+
+// Reads the next line (or 4094-byte piece) into `line`; false at the end of
+// the file or on a read error.
+bool ReadLine(FILE* stream, char* line);
+
+// Classes of a trimmed, non-empty line; a line that is neither is a key line.
+bool IsCommentLine(const char* text);
+bool IsSectionLine(const char* text);
+
+// The name on a section line, trimmed in place: the first run without
+// bracket characters. A line made only of brackets gives "".
+char* SectionName(rvConfig& config, char* text);
+
+// The trimmed key of a key line, after skipping delimiters at its start;
+// *rest is the text behind the delimiter, or null when there is none.
+char* KeyOfLine(rvConfig& config, char* text, char** rest);
+
+// The writing pass of Flush; 1 when the file was replaced as asked.
+unsigned int WritePass(rvConfig& config);
+
+}  // namespace tessaline::config
+
+#endif

@@ -1,0 +1,239 @@
+// Opening a configuration file and the reading pass.
+#include <cerrno>
+#include <cstring>
+#include <ctime>
+
+#include "config/class_lock.h"
+#include "config/passes.h"
+#include "config/sys.h"
+#include "tessaline/config/rvConfig.h"
+
+using tessaline::config::ScopedClassLock;
+
+namespace {
+
+constexpr int kOpenAttempts = 3;
+
+// The trim set " \t\n\r", tested without a call: Clean runs on every line.
+bool isTrimmed(char c)
+{
+    return c == ' ' || c == '\t' || c == '\n' || c == '\r';
+}
+
+void pauseOneSecond()
+{
+    timespec remaining = {1, 0};
+    while (nanosleep(&remaining, &remaining) != 0 && errno == EINTR) {
+    }
+}
+
+FILE* openByMode(const char* name, rvConfig::OpenMode mode)
+{
+    namespace sys = tessaline::config::sys;
+    switch (mode) {
+    case rvConfig::OpenRead:
+        return sys::OpenStream(name, "re");
+    case rvConfig::OpenWrite:
+        return sys::OpenStream(name, "we");
+    case rvConfig::OpenUpdate: {
+        FILE* stream = sys::OpenStream(name, "r+e");
+        return stream != nullptr ? stream : sys::OpenStream(name, "w+e");
+    }
+    }
+    return nullptr;
+}
+
+}  // namespace
+
+namespace tessaline::config {
+
+bool IsCommentLine(const char* text)
+{
+    return *text != '\0' && std::strchr(rvConfig::m_szCommentChars, *text) != nullptr;
+}
+
+bool IsSectionLine(const char* text)
+{
+    return *text != '\0' && std::strchr(rvConfig::m_szSectionChars, *text) != nullptr;
+}
+
+char* SectionName(rvConfig& config, char* text)
+{
+    char* start = text + std::strspn(text, rvConfig::m_szSectionChars);
+    start[std::strcspn(start, rvConfig::m_szSectionChars)] = '\0';
+    return config.Clean(start);
+}
+
+char* KeyOfLine(rvConfig& config, char* text, char** rest)
+{
+    char* start = text + std::strspn(text, rvConfig::m_szDelimChars);
+    char* delimiter = start + std::strcspn(start, rvConfig::m_szDelimChars);
+    *rest = nullptr;
+    if (*delimiter != '\0') {
+        *delimiter = '\0';
+        *rest = delimiter + 1;
+    }
+    return config.Clean(start);
+}
+
+bool ReadLine(FILE* stream, char* line)
+{
+    // Every use of the line is a C string, so only its first byte needs
+    // clearing, not the whole buffer.
+    line[0] = '\0';
+    return std::fgets(line, kLineLimit, stream) != nullptr;
+}
+
+}  // namespace tessaline::config
+
+namespace {
+
+using tessaline::config::KeyOfLine;
+using tessaline::config::ReadLine;
+
+// The value behind the delimiter: trimmed, then one opening quote removed
+// and the text cut at the last closing one. Null when nothing is stored.
+char* valueOfLine(rvConfig& config, char* rest)
+{
+    char* value = config.Clean(rest);
+    if (*value == '\0') {
+        return nullptr;
+    }
+    if (*value == '"') {
+        ++value;
+        char* closing = std::strrchr(value, '"');
+        if (closing != nullptr) {
+            *closing = '\0';
+        }
+    }
+    return value;
+}
+
+rvConfig::KeyTable& sectionKeys(rvConfig& config, const rvConfig::cfgStr& name)
+{
+    rvConfig::SectionTable::iterator found = config.m_sections.find(name);
+    if (found == config.m_sections.end()) {
+        found = config.m_sections.insert(rvConfig::SectionTable::value_type(name, rvConfig::KeyTable())).first;
+    }
+    return found->second;
+}
+
+void readPass(rvConfig& config)
+{
+    rvConfig::cfgStr running(config.m_strDefaultSection);
+    config.Clear();
+    config.m_strSection = config.m_strDefaultSection;
+    sectionKeys(config, config.m_strSection).clear();
+
+    // Only section lines and Section can change the section table between
+    // key lines, so the running section is looked up once per block.
+    rvConfig::KeyTable* keys = nullptr;
+    char line[tessaline::config::kLineBufferSize];
+    while (config.m_pFile != nullptr && !std::feof(config.m_pFile)) {
+        if (!ReadLine(config.m_pFile, line)) {
+            break;
+        }
+        char* text = config.Clean(line);
+        if (*text == '\0' || tessaline::config::IsCommentLine(text)) {
+            continue;
+        }
+        if (tessaline::config::IsSectionLine(text)) {
+            const char* name = tessaline::config::SectionName(config, text);
+            running = rvConfig::cfgStr(name);
+            keys = nullptr;
+            config.Section(name, 1);
+            continue;
+        }
+        char* rest;
+        const char* key = KeyOfLine(config, text, &rest);
+        if (*key == '\0' || rest == nullptr) {
+            continue;
+        }
+        const char* value = valueOfLine(config, rest);
+        if (value == nullptr) {
+            continue;
+        }
+        if (keys == nullptr) {
+            keys = &sectionKeys(config, running);
+        }
+        const std::pair<rvConfig::KeyTable::iterator, bool> added =
+            keys->insert(rvConfig::KeyTable::value_type(rvConfig::cfgStr(key), rvConfig::cfgStr()));
+        if (added.second) {
+            added.first->second = rvConfig::cfgStr(value);
+        }
+        ++config.m_nItems;
+    }
+    config.Close(0);
+    config.m_strSection = config.m_strDefaultSection;
+}
+
+}  // namespace
+
+FILE* rvConfig::Open(const char* name, OpenMode mode)
+{
+    if (m_pFile != nullptr) {
+        std::fclose(m_pFile);
+        m_pFile = nullptr;
+    }
+    if (name == nullptr) {
+        return nullptr;
+    }
+    for (int attempt = 1; (m_pFile = openByMode(name, mode)) == nullptr; ++attempt) {
+        pauseOneSecond();
+        if (attempt == kOpenAttempts) {
+            return nullptr;
+        }
+    }
+    ConfigName(name);
+    m_mode = mode;
+    return m_pFile;
+}
+
+unsigned int rvConfig::Load(const char* name, OpenMode mode)
+{
+    ScopedClassLock lock;
+    if (Open(name, mode) == nullptr) {
+        return 0;
+    }
+    Serialize(0);
+    Close(0);
+    ConfigName(name);
+    return 1;
+}
+
+unsigned int rvConfig::Close(unsigned int bFlush)
+{
+    if (m_pFile != nullptr) {
+        std::fclose(m_pFile);
+        m_pFile = nullptr;
+    }
+    if (bFlush != 0 && IsModified() != 0) {
+        Flush(0);
+    }
+    return 1;
+}
+
+unsigned int rvConfig::Serialize(unsigned int bWrite)
+{
+    if (bWrite != 0) {
+        return tessaline::config::WritePass(*this);
+    }
+    readPass(*this);
+    return 0;
+}
+
+char* rvConfig::Clean(char* text)
+{
+    if (text == nullptr || *text == '\0') {
+        return text;
+    }
+    char* start = text;
+    while (isTrimmed(*start)) {
+        ++start;
+    }
+    char* end = start + std::strlen(start);
+    while (end > start && isTrimmed(end[-1])) {
+        *--end = '\0';
+    }
+    return start;
+}

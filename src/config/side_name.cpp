@@ -1,0 +1,14 @@
+// Side-file names, formed through rvFilename.
+#include "config/side_name.h"
+#include "tessaline/files/rvFilename.h"
+
+std::string tessaline::config::SideFileName(const char* configName, const char* ext)
+{
+    rvFilename name(configName, 0);
+    name.Ext(ext);
+    std::string sideName(static_cast<const char*>(name));
+    if (sideName == configName) {
+        sideName.assign(configName).append(".").append(ext);
+    }
+    return sideName;
+}

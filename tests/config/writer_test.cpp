@@ -1,0 +1,307 @@
+// Saving: the merge of table and old file, side files, and what each
+// failure leaves on disk and in memory.
+#include <cerrno>
+#include <functional>
+#include <regex>
+#include <string>
+
+#include <gtest/gtest.h>
+
+#include "config/sys_seam.h"
+#include "config/temp_dir.h"
+#include "support/capture_stderr.h"
+#include "tessaline/config/rvConfig.h"
+
+namespace {
+
+using tessaline::config::testing::SetFaultHook;
+using tessaline::config::testing::SysCall;
+using tessaline::test::TempDir;
+using Change = std::function<void(rvConfig&)>;
+
+// The text without its identification line, which must be the only one
+// and the last line.
+std::string body(const std::string& text)
+{
+    static const std::regex idLine("# Edited by Tessaline: [A-Z][a-z]+ [0-9]{2}, [0-9]{4} - [0-9:]{8}\n$");
+    std::smatch match;
+    EXPECT_TRUE(std::regex_search(text, match, idLine)) << text;
+    const std::string rest = text.substr(0, text.size() - match.length());
+    EXPECT_EQ(rest.find("Edited by"), std::string::npos) << text;
+    return rest;
+}
+
+std::string rewrite(const std::string& content, const Change& change)
+{
+    TempDir dir;
+    rvConfig config(dir.Write("app.ini", content).c_str(), rvConfig::OpenUpdate);
+    change(config);
+    config.IsModified(1);
+    EXPECT_EQ(config.Flush(0), 1u);
+    EXPECT_FALSE(dir.Exists("app.new"));
+    return body(dir.Read("app.ini"));
+}
+
+struct Outcome {
+    unsigned int result;
+    std::string messages;
+};
+
+// Flushes a changed "k = 1" file of `dir` with the seam failing as `hook` says.
+Outcome flushWithFaults(const TempDir& dir, tessaline::config::testing::FaultHook hook, unsigned int backups)
+{
+    rvConfig config(dir.Write("app.ini", "k = 1\n").c_str(), rvConfig::OpenUpdate);
+    config.PutValue("k", "2", "");
+    rvConfig::m_bBackups = backups;
+    tessaline::test::CaptureStderr capture;
+    SetFaultHook(hook);
+    const unsigned int result = config.Flush(1);
+    SetFaultHook(nullptr);
+    rvConfig::m_bBackups = 0;
+    EXPECT_EQ(config.IsModified(), result == 0 ? 1u : 0u);
+    return Outcome{result, capture.Text()};
+}
+
+TEST(RvConfigWriter, WorkedCaseLineForLine)
+{
+    EXPECT_EQ(rewrite("# comment\na = 1\n\n[s1]\nb = 2\nc = 3\n# second\n[s2]\nd = 4\n"
+                      "# Edited by Tessaline: January 01, 2020 - 00:00:00\n",
+                      [](rvConfig& c) {
+                          c.PutValue("e", "5", "");
+                          c.PutValue("b", "22", "s1");
+                          c.PutValue("f", "6", "s1");
+                          c.RemoveKey("s1", "c");
+                          c.PutValue("g", "7", "s3");
+                      }),
+              "# comment\na = 1\n\ne = 5\n[s1]\nb = 22\n# second\nf = 6\n[s2]\nd = 4\n[s3]\ng = 7\n");
+}
+
+TEST(RvConfigWriter, LayoutSurvives)
+{
+    const Change none = [](rvConfig&) {};
+    const struct {
+        const char* old;
+        Change change;
+        const char* expected;
+    } rows[] = {
+        // Only blank lines keep their carriage returns and blanks.
+        {"  # indented\r\n \t \r\n[Net]\nPort=\"80\"\n", none, "  # indented\n \t \r\n[Net]\nPort = 80\n"},
+        {"[a]\n# about a\nk = 1\n[b]\nj = 2\n", [](rvConfig& c) { c.RemoveSection("a"); }, "# about a\n[b]\nj = 2\n"},
+        {"[s]\nx = 1\n[t]\nk = 1\n[S]\n# 2nd\ny = 2\nx = 3\n", none, "[s]\nx = 1\ny = 2\n[t]\nk = 1\n# 2nd\n"},
+        {"[s]\n[S]\nk = 1\n", none, "[s]\n[S]\nk = 1\n"},
+        {"[s]\nPORT = 1\n",
+         [](rvConfig& c) {
+             c.PutValue("port", "2", "s");
+             c.PutValue("Host", "h", "S");
+         },
+         "[s]\nPORT = 2\nHost = h\n"},
+        {"k\nk = 1\nempty =\nk = 2\n", none, "k = 1\n"},
+        {"# EDITED BY TESSALINE: x\nk = 1\n# Edited by Tessaline\n", none, "k = 1\n"},
+        {"# c\nk = 1\n\n[s]\nj = 2\n",
+         [](rvConfig& c) {
+             c.RemoveKey("defaults", "k");
+             c.RemoveSection("s");
+         },
+         "# c\n\n"},
+        {"top = 1\n# before s\n[s]\nk = 1\n\n# before t\n[t]\nj = 1\n",
+         [](rvConfig& c) {
+             c.PutValue("new", "d", "");
+             c.PutValue("new", "s", "s");
+             c.PutValue("new", "t", "t");
+         },
+         "top = 1\n# before s\nnew = d\n[s]\nk = 1\n\n# before t\nnew = s\n[t]\nj = 1\nnew = t\n"},
+        // New keys and sections in table order; empty sections never appear.
+        {"",
+         [](rvConfig& c) {
+             c.PutValue("k", "1", "");
+             c.PutValue("port", "1", "n");
+             c.PutValue("timeout", "2", "n");
+             c.Section("empty", 1);
+             c.PutValue("k", "v", "b");
+             c.PutValue("k", "v", "a");
+         },
+         "k = 1\n[a]\nk = v\n[b]\nk = v\n[n]\ntimeout = 2\nport = 1\n"},
+    };
+    for (const auto& row : rows) {
+        EXPECT_EQ(rewrite(row.old, row.change), row.expected) << row.old;
+    }
+}
+
+TEST(RvConfigWriter, TextGoesOutUnescaped)
+{
+    TempDir dir;
+    const std::string path = dir.Write("app.ini", std::string(5000, '#') + "\n");
+    rvConfig config(path.c_str(), rvConfig::OpenUpdate);
+    config.PutValue("k", "  padded  ", "");
+    config.PutValue("empty", "", "");
+    config.PutValue("long", std::string(5000, 'v').c_str(), "");
+    config.PutValue("a=b", "line\nbreak", "");
+    ASSERT_EQ(config.Flush(0), 1u);
+    const std::string text = body(dir.Read("app.ini"));
+    EXPECT_EQ(text.substr(0, 4095), std::string(4094, '#') + "\n");
+    EXPECT_NE(text.find("long = " + std::string(5000, 'v') + "\n"), std::string::npos);
+
+    rvConfig reread(path.c_str(), rvConfig::OpenRead);
+    EXPECT_STREQ(reread.GetValue("k", "d", ""), "padded");
+    EXPECT_STREQ(reread.GetValue("empty", "d", ""), "d");
+    EXPECT_STREQ(reread.GetValue("a", "d", ""), "b = line");
+    EXPECT_EQ(std::string(reread.GetValue("long", "d", "")).size(), 4094u - 7u);
+}
+
+TEST(RvConfigWriter, FlushStates)
+{
+    TempDir dir;
+    const std::string path = dir.Write("app.ini", "[s]\nk = 1\n");
+    rvConfig config(path.c_str(), rvConfig::OpenUpdate);
+    EXPECT_EQ(config.Flush(1), 1u);  // unmodified: no file touched, still cleared
+    EXPECT_EQ(dir.Read("app.ini"), "[s]\nk = 1\n");
+    EXPECT_EQ(config.SectionCnt(), 0u);
+
+    for (int i = 0; i < 50; ++i) {
+        config.PutValue(("key" + std::to_string(i)).c_str(), "v", ("sec" + std::to_string(i % 7)).c_str());
+    }
+    const auto listing = [&config] {
+        std::string all;
+        for (const char* s = config.EnumSections(1); s != nullptr; s = config.EnumSections(0)) {
+            for (const char* k = config.EnumTokens(s, 1); k != nullptr; k = config.EnumTokens(s, 0)) {
+                all += std::string(s) + "/" + k + ";";
+            }
+        }
+        return all;
+    };
+    const std::string before = listing();
+    ASSERT_EQ(config.Flush(0), 1u);
+    EXPECT_EQ(listing(), before);
+    EXPECT_STREQ(config.Section(), "sec6");  // the last section written
+    EXPECT_EQ(config.IsModified(), 0u);
+
+    // No old file: default keys first and without a header, no backup.
+    rvConfig::m_bBackups = 1;
+    rvConfig fresh;
+    fresh.ConfigName(dir.Path("fresh").c_str());
+    fresh.Mode(rvConfig::OpenUpdate);
+    fresh.PutValue("j", "2", "s");
+    fresh.PutValue("k", "1", "");
+    EXPECT_EQ(fresh.Close(1), 1u);
+    rvConfig::m_bBackups = 0;
+    EXPECT_EQ(body(dir.Read("fresh")), "k = 1\n[s]\nj = 2\n");
+    EXPECT_FALSE(dir.Exists("fresh.bak"));
+
+    // OpenWrite empties the old file first: no comments survive.
+    rvConfig written(dir.Write("write.ini", "# gone\nk = 1\n").c_str(), rvConfig::OpenUpdate);
+    written.Mode(rvConfig::OpenWrite);
+    written.PutValue("k", "2", "");
+    ASSERT_EQ(written.Flush(0), 1u);
+    EXPECT_EQ(body(dir.Read("write.ini")), "k = 2\n");
+}
+
+TEST(RvConfigWriter, BackupsNeverTakeTheFilesOwnName)
+{
+    const struct {
+        const char* name;
+        const char* backup;
+    } rows[] = {{"app.ini", "app.bak"}, {"app.new", "app.bak"}, {"app.bak", "app.bak.bak"}, {"new", "new.bak"}};
+    rvConfig::m_bBackups = 1;
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.name);
+        TempDir dir;
+        rvConfig config(dir.Write(row.name, "k = 1\n").c_str(), rvConfig::OpenUpdate);
+        for (const char* value : {"2", "3"}) {
+            config.PutValue("k", value, "");
+            EXPECT_EQ(config.Flush(0), 1u);
+        }
+        EXPECT_EQ(body(dir.Read(row.name)), "k = 3\n");
+        EXPECT_EQ(body(dir.Read(row.backup)), "k = 2\n");  // the file before the last write
+    }
+    rvConfig::m_bBackups = 0;
+}
+
+TEST(RvConfigWriter, RefusalsLeaveEverything)
+{
+    TempDir dir;
+    const std::string path = dir.Write("app.ini", "k = 1\n");
+    rvConfig unnamed;
+    unnamed.Mode(rvConfig::OpenUpdate);
+    unnamed.PutValue("k", "2", "");
+    EXPECT_EQ(unnamed.Flush(1), 0u);
+    rvConfig config(path.c_str(), rvConfig::OpenRead);
+    config.PutValue("k", "2", "");
+    EXPECT_EQ(config.Flush(1), 0u);
+    config.Mode(rvConfig::OpenUpdate);
+    SetFaultHook([](SysCall call, const char*) { return call == SysCall::Writable ? EACCES : 0; });
+    EXPECT_EQ(config.Flush(1), 0u);
+    SetFaultHook(nullptr);
+    EXPECT_EQ(dir.Read("app.ini"), "k = 1\n");
+    EXPECT_EQ(config.IsModified(), 1u);
+    EXPECT_EQ(config.Close(1), 1u);
+    EXPECT_EQ(body(dir.Read("app.ini")), "k = 2\n");
+}
+
+TEST(RvConfigWriter, FailedWritesKeepTheOldFile)
+{
+    const tessaline::config::testing::FaultHook hooks[] = {
+        [](SysCall call, const char*) { return call == SysCall::Write ? ENOSPC : 0; },
+        [](SysCall call, const char*) { return call == SysCall::Sync ? EIO : 0; },
+        [](SysCall call, const char*) { return call == SysCall::Close ? EIO : 0; },
+    };
+    for (const auto hook : hooks) {
+        TempDir dir;
+        const Outcome outcome = flushWithFaults(dir, hook, 0);
+        EXPECT_EQ(outcome.result, 0u);
+        EXPECT_EQ(outcome.messages, "");
+        EXPECT_EQ(dir.Read("app.ini"), "k = 1\n");
+        EXPECT_FALSE(dir.Exists("app.new"));
+    }
+}
+
+TEST(RvConfigWriter, ReplacementFailures)
+{
+    {
+        TempDir dir;
+        const auto backupRenameFails = [](SysCall call, const char* from) {
+            return call == SysCall::Rename && std::string(from).find(".ini") != std::string::npos ? EXDEV : 0;
+        };
+        const Outcome outcome = flushWithFaults(dir, backupRenameFails, 1);
+        EXPECT_EQ(outcome.result, 0u);
+        EXPECT_EQ(outcome.messages,
+                  "Error creating backup config file " + dir.Path("app.ini") + ": Invalid cross-device link\n");
+        EXPECT_EQ(body(dir.Read("app.ini")), "k = 2\n");
+    }
+    {
+        TempDir dir;
+        const Outcome outcome =
+            flushWithFaults(dir, [](SysCall call, const char*) { return call == SysCall::Unlink ? EPERM : 0; }, 0);
+        EXPECT_EQ(outcome.result, 1u);
+        EXPECT_EQ(outcome.messages, "rvConfig: unlink(" + dir.Path("app.ini") + ") failed: Operation not permitted (1).");
+        EXPECT_EQ(body(dir.Read("app.ini")), "k = 2\n");
+    }
+    {
+        // Without backups the temporary file is the only copy: it stays.
+        TempDir dir;
+        const Outcome outcome =
+            flushWithFaults(dir, [](SysCall call, const char*) { return call == SysCall::Rename ? EIO : 0; }, 0);
+        EXPECT_EQ(outcome.result, 0u);
+        EXPECT_EQ(outcome.messages, "rvConfig: rename(" + dir.Path("app.new") + ", " + dir.Path("app.ini") +
+                                        ") failed: Input/output error (5).");
+        EXPECT_FALSE(dir.Exists("app.ini"));
+        EXPECT_EQ(body(dir.Read("app.new")), "k = 2\n");
+    }
+    {
+        // With backups the old text is the backup; the temporary file goes,
+        // and its failed removal is reported too.
+        TempDir dir;
+        const auto tempCannotMove = [](SysCall call, const char* name) {
+            const bool temp = std::string(name).find(".new") != std::string::npos;
+            return temp && (call == SysCall::Rename || call == SysCall::Unlink) ? EIO : 0;
+        };
+        const Outcome outcome = flushWithFaults(dir, tempCannotMove, 1);
+        const std::string temp = dir.Path("app.new");
+        EXPECT_EQ(outcome.result, 0u);
+        EXPECT_EQ(outcome.messages, "rvConfig: rename(" + temp + ", " + dir.Path("app.ini") +
+                                        ") failed: Input/output error (5).rvConfig: unlink(" + temp +
+                                        ") failed: Input/output error (5).");
+        EXPECT_EQ(dir.Read("app.bak"), "k = 1\n");
+    }
+}
+
+}  // namespace
