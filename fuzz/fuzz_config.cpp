@@ -15,10 +15,16 @@
 //  - a value that is empty, begins with a double quote or has blanks at an
 //    end: the reader drops the empty value, removes the quote and trims;
 //  - a key or section name the reader would take apart (delimiter, bracket,
-//    comment character in front, line end, blanks at an end);
-//  - a written line of 4094 bytes or more, which the reader takes in pieces;
+//    comment character in front, line end, blanks at an end). Files give
+//    such keys too: a key line that begins with the delimiter ("=[x = 1")
+//    holds the key "[x", which is written back as "[x = 1", a section line
+//    that moves every key below it into another section;
+//  - a written line of 4094 bytes or more, which the reader takes in pieces
+//    (and the second piece may be a section line too);
 //  - keys in the section with the empty name, which the writer leaves out
 //    unless the old file has a header for it.
+// Where a name or a line would change the structure of the file, check 2 is
+// left out as a whole; where only a value would not come back, that value.
 // For check 3 the rewritten file must itself be a writer's file: a blank
 // line copied from the input without its line end (one cut short by a NUL
 // byte, or the last line of a file without a final newline) runs into the
@@ -131,35 +137,40 @@ bool RepresentableValue(const std::string& value)
     return IsTrimmed(value) && !HasAny(value, "\n") && value.front() != '"';
 }
 
-bool RepresentableKeyLine(const Entry& entry)
+// Names and line lengths that the reader takes back as the writer meant
+// them. Values play no part in the structure of the file.
+bool KeepsStructure(const Entry& entry)
 {
-    return RepresentableKey(entry.key) && RepresentableValue(entry.value) &&
+    return (entry.section.empty() || RepresentableSection(entry.section)) && RepresentableKey(entry.key) &&
            entry.key.size() + 3 + entry.value.size() < kLinePiece;
-}
-
-bool Representable(const Entry& entry)
-{
-    return RepresentableSection(entry.section) && RepresentableKeyLine(entry);
 }
 
 bool SameName(const std::string& a, const std::string& b) { return strcasecmp(a.c_str(), b.c_str()) == 0; }
 
 // Check 2: `written` was flushed, `read` is what the file gave back.
-void CheckReadBack(const Table& written, const Table& read, rvConfig& reader)
+void CheckReadBack(const Table& written, const Table& read, rvConfig& reader, const std::string& file)
 {
-    bool everythingRepresentable = true;
     for (const Entry& entry : written) {
-        if (entry.section.empty())
-            continue;
-        if (!Representable(entry)) {
-            everythingRepresentable = false;
+        if (!KeepsStructure(entry))
+            return;
+    }
+    bool everyValueRepresentable = true;
+    for (const Entry& entry : written) {
+        if (!RepresentableValue(entry.value)) {
+            everyValueRepresentable = false;
             continue;
         }
+        if (entry.section.empty())
+            continue;
         const char* value = reader.GetValue(entry.key.c_str(), static_cast<const char*>(nullptr),
                                             entry.section.c_str());
-        FUZZ_CHECK(value != nullptr && entry.value == value);
+        if (value == nullptr || entry.value != value) {
+            fprintf(stderr, "[%s] %s = %s read back as %s from:\n%s---\n", entry.section.c_str(),
+                    entry.key.c_str(), entry.value.c_str(), value ? value : "(missing)", file.c_str());
+            FUZZ_CHECK(value != nullptr && entry.value == value);
+        }
     }
-    if (!everythingRepresentable)
+    if (!everyValueRepresentable)
         return;
     for (const Entry& entry : read) {
         bool known = false;
@@ -349,7 +360,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
     const std::string first = ReadFile(g_path);
     if (tidy) {
         rvConfig reader(g_path.c_str(), rvConfig::OpenUpdate);
-        CheckReadBack(flushed, Snapshot(reader), reader);
+        CheckReadBack(flushed, Snapshot(reader), reader, first);
     }
 
     // F1 to F2 to F3, with no change but the forced flag. F2 is written
@@ -360,9 +371,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
     const std::string third = Rewrite(nullptr);
     if (HasLongLine(second))
         return 0;
-    // A section with the empty name reaches F2 only under a header F1 has.
     for (const Entry& entry : firstTable) {
-        if (!RepresentableKeyLine(entry) || (!entry.section.empty() && !RepresentableSection(entry.section)))
+        if (!KeepsStructure(entry) || !RepresentableValue(entry.value))
             return 0;
     }
     if (WithoutLastLine(third) != WithoutLastLine(second)) {
