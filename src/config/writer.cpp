@@ -135,6 +135,12 @@ void mergeKeyLine(rvConfig& config, TempFile& out, char* text, const rvConfig::c
     if (*key == '\0') {
         return;
     }
+    // "" in GetValue is the current section. Below a nameless section line
+    // whose section is gone, that is another section, whose keys must not be
+    // pulled up here: the file would give them back in the wrong section.
+    if (running.empty() && config.m_sections.find(running) == config.m_sections.end()) {
+        return;
+    }
     const char* value = config.GetValue(key, static_cast<const char*>(nullptr), running.c_str());
     if (value == nullptr) {
         return;

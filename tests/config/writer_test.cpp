@@ -110,6 +110,18 @@ TEST(RvConfigWriter, LayoutSurvives)
              c.PutValue("new", "t", "t");
          },
          "top = 1\n# before s\nnew = d\n[s]\nk = 1\n\n# before t\nnew = s\n[t]\nj = 1\nnew = t\n"},
+        // The nameless section's header survives with its keys. Once that
+        // section is gone, its old key lines go too and never take a key of
+        // the current section with the same name, which would then read back
+        // in another section.
+        {"[]\nk = 1\n", none, "[]\nk = 1\n"},
+        {"top = 1\n[]\nk = 1\n",
+         [](rvConfig& c) {
+             c.RemoveSection("");
+             c.PutValue("k", "2", "x");
+             c.Section("x", 0);
+         },
+         "top = 1\n[x]\nk = 2\n"},
         // New keys and sections in table order; empty sections never appear.
         {"",
          [](rvConfig& c) {
