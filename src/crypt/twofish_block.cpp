@@ -4,6 +4,10 @@
 
 #include "crypt/twofish_internal.h"
 
+// Table and block offsets here are products of small bounded ints (at most
+// 4 KiB of tables, whole blocks of a caller's buffer); none can overflow.
+// NOLINTBEGIN(bugprone-implicit-widening-of-multiplication-result)
+
 using namespace tessaline_crypt;
 
 namespace {
@@ -285,3 +289,4 @@ int blockDecrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input,
 }
 
 }  // extern "C"
+// NOLINTEND(bugprone-implicit-widening-of-multiplication-result)

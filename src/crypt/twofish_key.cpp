@@ -7,6 +7,10 @@
 
 #include "crypt/twofish_internal.h"
 
+// Table and block offsets here are products of small bounded ints (at most
+// 4 KiB of tables, whole blocks of a caller's buffer); none can overflow.
+// NOLINTBEGIN(bugprone-implicit-widening-of-multiplication-result)
+
 using namespace tessaline_crypt;
 
 namespace {
@@ -209,3 +213,4 @@ int TableOp(int op)
 }
 
 }  // extern "C"
+// NOLINTEND(bugprone-implicit-widening-of-multiplication-result)
