@@ -164,12 +164,13 @@ unsigned int tessaline::config::FindValue(rvConfig& config, const rvConfig::cfgS
     return 1;
 }
 
-unsigned int rvConfig::_GetValue(cfgStr key, cfgStr* value, cfgStr section)
+// The by-value parameters are the interface's fixed signature.
+unsigned int rvConfig::_GetValue(cfgStr key, cfgStr* value, cfgStr section)  // NOLINT(performance-unnecessary-value-param)
 {
     return tessaline::config::FindValue(*this, key, value, section);
 }
 
-unsigned int rvConfig::_PutValue(cfgStr key, cfgStr value, cfgStr section)
+unsigned int rvConfig::_PutValue(cfgStr key, cfgStr value, cfgStr section)  // NOLINT(performance-unnecessary-value-param)
 {
     ScopedClassLock lock;
     const cfgStr& name = section.empty() ? m_strSection : section;

@@ -1,234 +1,258 @@
 // rvCopyFile: files, wildcards and trees, copied, linked or moved.
+//
+// Below the paths the host names, both sides of a tree copy are reached
+// through the open descriptors of their directories, never by their texts
+// again. The source side reads through symbolic links as it finds them; the
+// target side never writes through one, and `move` removes only files that
+// were not reached through a link to a directory.
 #include "tessaline/files/rvCopy.h"
 
-#include <algorithm>
+#include <cerrno>
 #include <cstring>
+#include <string>
 
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include "files/copy_bytes.h"
+#include "files/open_at.h"
 #include "files/sys.h"
-#include "tessaline/files/rvDirIterator.h"
-#include "tessaline/files/rvFileApi.h"
+#include "files/tree.h"
 #include "tessaline/files/rvFilename.h"
 #include "tessaline/files/rvPath.h"
 #include "tessaline/util/HashToken.h"
 #include "util/scheme_tokens.h"
 
+using tessaline::files::DirectoryFd;
+using tessaline::files::Links;
+using tessaline::files::OwnedHandle;
+using tessaline::files::Place;
 using tessaline::files::Sys;
+using tessaline::files::Walk;
 
 namespace {
 
-constexpr size_t kCopyBufferSize = 0x4000;
 constexpr int kReadWriteCreate = O_RDWR | O_CREAT;
 constexpr int kSourceOpenMode = 0664;
-
-void* const kInvalidHandle = reinterpret_cast<void*>(static_cast<intptr_t>(-1));
+constexpr mode_t kNewDirectoryMode = 06775;
 
 struct CopyOptions {
     unsigned int recurse;
     unsigned int overwrite;
     unsigned int link;
     unsigned int move;
-    const char* aux1;
-    const char* aux2;
     unsigned long mode;
 };
 
-int Copy(const char* source, const char* target, const CopyOptions& options)
-{
-    return rvCopyFile(source, target, options.recurse, options.overwrite, options.link,
-                      options.move, options.aux1, options.aux2, options.mode);
-}
+// One side of a copy. `below` marks a place under the path the host named;
+// `throughLink` a source reached through a symbolic link to a directory.
+struct End {
+    Place place;
+    bool below;
+    bool throughLink;
+};
 
 bool IsWildcard(const char* path)
 {
     return std::strpbrk(path, "*?") != nullptr;
 }
 
-bool IsDotOrDotDot(const char* name)
+int StatAt(const Place& place, struct stat* info)
 {
-    return std::strcmp(name, ".") == 0 || std::strcmp(name, "..") == 0;
+    return Sys().fstatat(place.directory, place.name, info, 0);
 }
 
-// Owns a handle until Close; the destructor closes one still open.
-class OwnedHandle {
-public:
-    explicit OwnedHandle(void* handle) : m_handle(handle) {}
-    ~OwnedHandle() { Close(); }
-    OwnedHandle(const OwnedHandle&) = delete;
-    OwnedHandle& operator=(const OwnedHandle&) = delete;
-
-    bool IsOpen() const { return m_handle != kInvalidHandle; }
-    void* Get() const { return m_handle; }
-
-    // 1 when the handle closed cleanly (or was not open).
-    int Close()
-    {
-        if (!IsOpen()) {
-            return 1;
-        }
-        void* handle = m_handle;
-        m_handle = kInvalidHandle;
-        return CloseHandle(handle);
-    }
-
-private:
-    void* m_handle;
-};
-
-// Writes all of `count` bytes, completing short writes; false when a write
-// fails or makes no progress.
-bool WriteAll(void* handle, const char* data, unsigned long count)
+int ExistsAt(const Place& place)
 {
-    while (count > 0) {
-        unsigned long written = 0;
-        if (WriteFile(handle, data, count, &written, nullptr) == 0 || written == 0) {
-            return false;
-        }
-        data += written;
-        count -= written;
-    }
-    return true;
+    return Sys().faccessat(place.directory, place.name, F_OK, 0) == 0;
 }
 
-// Copies the source's size in bytes, as it stood when the copy began. A read
-// that finds the end early (the source shrank) fails; one that would pass
-// the size (the source grew) is cut to it.
-bool CopyBytes(void* from, void* to)
-{
-    int64_t left = rvGetFileSize64(from);
-    if (left < 0) {
-        return false;
-    }
-    char buffer[kCopyBufferSize];
-    while (left != 0) {
-        const unsigned long want =
-            static_cast<unsigned long>(std::min<int64_t>(left, kCopyBufferSize));
-        unsigned long got = 0;
-        if (ReadFile(from, buffer, want, &got, nullptr) == 0 || got == 0) {
-            return false;
-        }
-        if (!WriteAll(to, buffer, got)) {
-            return false;
-        }
-        left -= static_cast<int64_t>(got);
-    }
-    return true;
-}
-
-bool SameFile(const char* first, const char* second)
+bool SameFile(const Place& first, const Place& second)
 {
     struct stat a;
     struct stat b;
-    return Sys().stat(first, &a) == 0 && Sys().stat(second, &b) == 0 && a.st_dev == b.st_dev &&
+    return StatAt(first, &a) == 0 && StatAt(second, &b) == 0 && a.st_dev == b.st_dev &&
            a.st_ino == b.st_ino;
 }
 
-bool IsRefusedScheme(rvFilename& name)
+bool IsRefusedScheme(const char* text)
 {
+    rvFilename name(text, 0);
     const int scheme = HashToken(name.Scheme(), tessaline::g_schemeTokens,
                                  tessaline::kSchemeTokenLast, 0, 1);
     return scheme == tessaline::kSchemeFtp || scheme == tessaline::kSchemeHttp;
 }
 
-// The wildcard way: every match of `src` into the directory `dst`.
-int CopyMatches(rvFilename& src, rvFilename& dst, const char* target, const CopyOptions& options)
+// CreateDir for a target; below the host's path the parent is already open.
+int MakeDirectory(const End& target)
 {
-    if (options.link != 0 && Sys().symlink(src.Directory(), dst.Directory()) == 0) {
+    if (!target.below) {
+        return CreateDir(target.place.text, 0);
+    }
+    if (ExistsAt(target.place)) {
         return 1;
     }
-    if (CreateDir(dst, 0) == 0) {
+    if (errno != ENOENT) {
+        return 0;
+    }
+    return Sys().mkdirat(target.place.directory, target.place.name, kNewDirectoryMode) == 0;
+}
+
+// The link of a wildcard's whole directory. Below the host's path the new
+// name can only be the target itself; its directory exists, so a link there
+// would fail anyway.
+bool LinkDirectory(const char* existing, const End& target)
+{
+    rvFilename to(target.place.text, 0);
+    if (!target.below) {
+        return Sys().symlinkat(existing, AT_FDCWD, to.Directory()) == 0;
+    }
+    return std::strcmp(to.Directory(), target.place.text) == 0 &&
+           Sys().symlinkat(existing, target.place.directory, target.place.name) == 0;
+}
+
+int CopyAt(const End& source, const End& target, const CopyOptions& options);
+
+// The wildcard way: every match of `wildcardText` into the directory `target`.
+int CopyMatches(const End& source, const char* wildcardText, const End& target,
+                const CopyOptions& options)
+{
+    if (options.link != 0 &&
+        LinkDirectory(rvFilename(wildcardText, 0).Directory(), target)) {
+        return 1;
+    }
+    if (MakeDirectory(target) == 0) {
+        return 0;
+    }
+    // The target is judged once: a directory takes the members under their
+    // own names; anything else takes every member in turn, unless it is a
+    // link to a directory below the host's path, which is never written into.
+    const DirectoryFd into = tessaline::files::OpenDirectory(
+        target.place, target.below ? Links::kRefuse : Links::kFollow);
+    if (!into.IsOpen() && target.below && tessaline::files::IsDirectoryAt(target.place) == 1) {
+        return 0;
+    }
+    const std::string intoText = rvFilename(target.place.text, 0).Directory();
+
+    const Walk walk =
+        tessaline::files::OpenWalk(source.place, wildcardText, Links::kFollow, source.throughLink);
+    if (walk.directory < 0) {
         return 0;
     }
     int total = 0;
-    for (rvDirIterator entry(src); entry != rvDirIterator(); ++entry) {
-        if (IsDotOrDotDot(*entry)) {
-            continue;
+    tessaline::files::ForEachEntry(walk.directory, walk.pattern.c_str(), [&](const char* entry) {
+        rvFilename item(entry, 0);
+        item.Directory(walk.memberDirectory.c_str());
+        std::string fromName;
+        if (!tessaline::files::NameInside(walk.memberDirectory.c_str(), item, &fromName)) {
+            return;
         }
-        rvFilename item(*entry, 0);
-        item.Directory(src.Directory());
-        if (options.recurse == 0 && rvFilename::IsDirectory(item) == 1) {
-            continue;
+        const End from{{walk.directory, fromName.c_str(), item}, true, walk.throughLink};
+        if (options.recurse == 0 && tessaline::files::IsDirectoryAt(from.place) == 1) {
+            return;
         }
-        rvFilename to(target, 0);
-        if (rvFilename::IsDirectory(to) == 1) {
-            to.Join(nullptr, nullptr, to.Directory(), item.File(), item.Ext());
+        if (!into.IsOpen()) {
+            total += CopyAt(from, target, options);
+            return;
         }
-        total += Copy(item, to, options);
-    }
+        rvFilename to(nullptr, 0);
+        to.Join(nullptr, nullptr, intoText.c_str(), item.File(), item.Ext());
+        std::string toName;
+        if (tessaline::files::NameInside(intoText.c_str(), to, &toName)) {
+            total += CopyAt(from, End{{into.Get(), toName.c_str(), to}, true, false}, options);
+        }
+    });
     return total;
 }
 
-// The single way: one file onto the file `dst`.
-int CopyOne(rvFilename& src, rvFilename& dst, const char* target, const CopyOptions& options)
+// The single way: one file onto the file `target`.
+int CopyOne(const End& source, const End& target, const CopyOptions& options)
 {
-    if (Sys().access(src, F_OK) != 0) {
+    if (!ExistsAt(source.place)) {
         return 0;
     }
-    if (rvFilename::IsDirectory(src) == 1) {
-        return Copy(src.File("*"), target, options);
+    if (tessaline::files::IsDirectoryAt(source.place) == 1) {
+        // Below the host's path the text is not split again: the split asks
+        // the file system, which may answer differently by now.
+        rvFilename all(source.place.text, 0);
+        const std::string wildcard =
+            source.below ? std::string(source.place.text) + "/*" : all.File("*");
+        return CopyMatches(source, wildcard.c_str(), target, options);
     }
     unsigned int overwrite = options.overwrite;
-    if (overwrite == 1 && CreateDir(dst.Directory(), 0) == 0) {
+    if (overwrite == 1 && !target.below &&
+        CreateDir(rvFilename(target.place.text, 0).Directory(), 0) == 0) {
         return 0;
     }
-    if (overwrite != 1 && Sys().access(dst, F_OK) == 0) {
+    if (overwrite != 1 && ExistsAt(target.place)) {
         struct stat from;
         struct stat to;
-        if (Sys().stat(src, &from) == 0 && Sys().stat(dst, &to) == 0) {
+        if (StatAt(source.place, &from) == 0 && StatAt(target.place, &to) == 0) {
             if (from.st_mtime == to.st_mtime && from.st_size == to.st_size) {
                 return 0;
             }
             overwrite = 1;
         }
     }
-    if (IsRefusedScheme(src)) {
+    if (IsRefusedScheme(source.place.text)) {
         return 0;
     }
     if (options.link != 0) {
-        return Sys().symlink(src, dst) == 0 ? 1 : 0;
+        return Sys().symlinkat(source.place.text, target.place.directory, target.place.name) == 0
+                   ? 1
+                   : 0;
     }
-    if (SameFile(src, dst)) {
+    if (SameFile(source.place, target.place)) {
         return 0;
     }
 
-    OwnedHandle from(CreateFile(src, O_RDONLY | O_CLOEXEC, 0, nullptr, 0, kSourceOpenMode, nullptr));
+    OwnedHandle from(tessaline::files::CreateFileAt(source.place.directory, source.place.name,
+                                                    O_RDONLY | O_CLOEXEC, 0, kSourceOpenMode));
     if (!from.IsOpen()) {
         return 0;
     }
-    OwnedHandle to(CreateFile(dst, kReadWriteCreate | O_CLOEXEC, 0, nullptr,
-                              overwrite != 0 ? O_TRUNC : O_EXCL, static_cast<int>(options.mode),
-                              nullptr));
+    // Below the host's path a link at the target's name is not written
+    // through: it may lead anywhere.
+    const int targetAccess = kReadWriteCreate | O_CLOEXEC | (target.below ? O_NOFOLLOW : 0);
+    OwnedHandle to(tessaline::files::CreateFileAt(target.place.directory, target.place.name,
+                                                  targetAccess,
+                                                  overwrite != 0 ? O_TRUNC : O_EXCL,
+                                                  static_cast<int>(options.mode)));
     if (!to.IsOpen()) {
         return 0;
     }
-    bool copied = CopyBytes(from.Get(), to.Get());
+    bool copied = tessaline::files::CopyBytes(from.Get(), to.Get());
     from.Close();
     copied = to.Close() == 1 && copied;
 
     if (!copied) {
-        Sys().unlink(dst);
+        Sys().unlinkat(target.place.directory, target.place.name, 0);
         return 0;
     }
-    if (options.move != 0) {
-        Sys().unlink(src);
+    if (options.move != 0 && !source.throughLink) {
+        Sys().unlinkat(source.place.directory, source.place.name, 0);
     }
     return 1;
+}
+
+int CopyAt(const End& source, const End& target, const CopyOptions& options)
+{
+    return IsWildcard(source.place.text) ? CopyMatches(source, source.place.text, target, options)
+                                         : CopyOne(source, target, options);
 }
 
 }  // namespace
 
 int rvCopyFile(const char* source, const char* target, unsigned int recurse,
-               unsigned int overwrite, unsigned int link, unsigned int move, const char* aux1,
-               const char* aux2, unsigned long mode)
+               unsigned int overwrite, unsigned int link, unsigned int move, const char* /*aux1*/,
+               const char* /*aux2*/, unsigned long mode)
 {
     if (source == nullptr || target == nullptr) {
         return 0;
     }
-    const CopyOptions options = {recurse, overwrite, link, move, aux1, aux2, mode};
-    rvFilename src(source, 0);
-    rvFilename dst(target, 0);
-    return IsWildcard(source) ? CopyMatches(src, dst, target, options)
-                              : CopyOne(src, dst, target, options);
+    const CopyOptions options = {recurse, overwrite, link, move, mode};
+    const rvFilename src(source, 0);
+    const rvFilename dst(target, 0);
+    return CopyAt(End{Place::Host(src), false, false}, End{Place::Host(dst), false, false},
+                  options);
 }

@@ -11,6 +11,7 @@
 #include <unistd.h>
 
 #include "files/sys.h"
+#include "files/tree.h"
 
 using tessaline::files::Sys;
 
@@ -47,11 +48,7 @@ rvDirIterator_rep::rvDirIterator_rep(const char* path)
     : m_error(0), m_dir(nullptr), m_refs(1), m_entry(nullptr), m_pattern(path, 0)
 {
     rvFilename directory(nullptr, 0);
-    directory.Join(nullptr, m_pattern.Server(), m_pattern.Directory(), nullptr, nullptr);
-    m_pattern.Join(nullptr, nullptr, nullptr, m_pattern.File(), m_pattern.Ext());
-    if (*static_cast<const char*>(m_pattern) == '\0') {
-        m_pattern = "*";
-    }
+    tessaline::files::SplitWalk(path, &directory, &m_pattern);
 
     const char* place = directory;
     std::unique_ptr<DIR, DirCloser> dir(Sys().opendir(place));
@@ -120,7 +117,9 @@ rvDirIterator::~rvDirIterator()
     LetGo(m_rep);
 }
 
-rvDirIterator& rvDirIterator::operator=(const rvDirIterator& other)
+// Taking the new reference before letting go of the old one makes
+// self-assignment safe.
+rvDirIterator& rvDirIterator::operator=(const rvDirIterator& other)  // NOLINT(bugprone-unhandled-self-assignment,cert-oop54-cpp)
 {
     rvDirIterator_rep* rep = other.m_rep;
     const char* name = other.m_name;

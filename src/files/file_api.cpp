@@ -8,6 +8,7 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include "files/open_at.h"
 #include "files/sys.h"
 #include "tessaline/util/rvString.h"
 
@@ -32,11 +33,13 @@ void* Handle(int fd)
     return reinterpret_cast<void*>(static_cast<intptr_t>(fd));
 }
 
-int OpenRetryingInterrupts(const char* path, int flags, int mode)
+// One attempt: `open` repeated at once while a signal interrupts it.
+template <typename Open>
+int OpenRetryingInterrupts(Open open)
 {
     int fd;
     do {
-        fd = Sys().open(path, flags, static_cast<mode_t>(mode));
+        fd = open();
     } while (fd < 0 && errno == EINTR);
     return fd;
 }
@@ -61,14 +64,12 @@ int TransferRetryingInterrupts(unsigned long* done, Transfer transfer)
     return result == -1 ? 0 : 1;
 }
 
-}  // namespace
-
-void* CreateFile(const char* path, int access, int /*share*/, void* /*security*/,
-                 int disposition, int mode, void* /*templateFile*/)
+// The attempts and pauses of CreateFile around any way of opening.
+template <typename Open>
+void* OpenWithAttempts(Open open)
 {
-    const int flags = access | disposition | kLargeFileFlag;
     for (int attempt = 0; attempt < kOpenAttempts; ++attempt) {
-        const int fd = OpenRetryingInterrupts(path, flags, mode);
+        const int fd = OpenRetryingInterrupts(open);
         if (fd >= 0) {
             return Handle(fd);
         }
@@ -82,6 +83,26 @@ void* CreateFile(const char* path, int access, int /*share*/, void* /*security*/
         }
     }
     return Handle(-1);
+}
+
+}  // namespace
+
+namespace tessaline::files {
+
+void* CreateFileAt(int directory, const char* name, int access, int disposition, int mode)
+{
+    const int flags = access | disposition | kLargeFileFlag;
+    return OpenWithAttempts(
+        [&] { return Sys().openat(directory, name, flags, static_cast<mode_t>(mode)); });
+}
+
+}  // namespace tessaline::files
+
+void* CreateFile(const char* path, int access, int /*share*/, void* /*security*/,
+                 int disposition, int mode, void* /*templateFile*/)
+{
+    const int flags = access | disposition | kLargeFileFlag;
+    return OpenWithAttempts([&] { return Sys().open(path, flags, static_cast<mode_t>(mode)); });
 }
 
 int CloseHandle(void* handle)

@@ -1,77 +1,117 @@
 // rvUnlink: files, wildcards and trees removed.
+//
+// Below the path the host names, every member is reached through the open
+// descriptor of the directory it was listed in, and a directory is entered
+// only with O_NOFOLLOW: a directory swapped for a symbolic link while the
+// walk works is removed as the link it has become, and what it leads to stays.
 #include "tessaline/files/rvCopy.h"
 
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
+#include <string>
 
 #include <unistd.h>
 
 #include "files/sys.h"
-#include "tessaline/files/rvDirIterator.h"
+#include "files/tree.h"
 #include "tessaline/files/rvFilename.h"
 
+using tessaline::files::DirectoryFd;
+using tessaline::files::Links;
+using tessaline::files::Place;
 using tessaline::files::Sys;
+using tessaline::files::Walk;
 
 namespace {
 
 constexpr mode_t kWritableByAll = 0222;
 
-bool IsDotOrDotDot(const char* name)
+bool IsWildcard(const char* path)
 {
-    return std::strcmp(name, ".") == 0 || std::strcmp(name, "..") == 0;
+    return std::strpbrk(path, "*?") != nullptr;
 }
 
-int RemoveMatches(rvFilename& name, unsigned int recurse)
+int RemoveAt(const Place& place, unsigned int recurse);
+
+// Calls `remove` with the place of every member of `directory` that `walk`
+// lists, named as rvFilename joins it to `directoryText`. A member whose
+// joined text leads out of the directory is left alone.
+template <typename Remove>
+void ForEachMember(int directory, const std::string& directoryText, const char* pattern,
+                   Remove remove)
 {
+    tessaline::files::ForEachEntry(directory, pattern, [&](const char* entry) {
+        rvFilename item(entry, 0);
+        item.Directory(directoryText.c_str());
+        std::string name;
+        if (tessaline::files::NameInside(directoryText.c_str(), item, &name)) {
+            remove(Place{directory, name.c_str(), item});
+        }
+    });
+}
+
+int RemoveMatches(const Place& entry, unsigned int recurse)
+{
+    const Walk walk = tessaline::files::OpenWalk(entry, entry.text, Links::kRefuse, false);
     int total = 0;
-    for (rvDirIterator entry(name); entry != rvDirIterator(); ++entry) {
-        if (IsDotOrDotDot(*entry)) {
-            continue;
-        }
-        rvFilename item(*entry, 0);
-        item.Directory(name.Directory());
-        if (recurse == 0 && rvFilename::IsDirectory(item) == 1) {
-            continue;
-        }
-        total += rvUnlink(item, recurse);
+    if (walk.directory >= 0) {
+        ForEachMember(walk.directory, walk.memberDirectory, walk.pattern.c_str(),
+                      [&](const Place& member) {
+                          if (recurse == 0 && tessaline::files::IsDirectoryAt(member) == 1) {
+                              return;
+                          }
+                          total += RemoveAt(member, recurse);
+                      });
     }
     return total;
 }
 
 // A link to a directory goes as a link; a real directory is emptied first.
 // A directory that stays non-empty is left in silence.
-int RemoveTree(const char* path)
+int RemoveTree(const Place& place)
 {
     int total = 0;
-    if (Sys().unlink(path) != 0) {
-        for (rvDirIterator entry(path); entry != rvDirIterator(); ++entry) {
-            if (IsDotOrDotDot(*entry)) {
-                continue;
-            }
-            rvFilename item(*entry, 0);
-            item.Directory(path);
-            total += rvUnlink(item, 1);
+    if (Sys().unlinkat(place.directory, place.name, 0) != 0) {
+        const DirectoryFd directory = tessaline::files::OpenDirectory(place, Links::kRefuse);
+        if (directory.IsOpen()) {
+            ForEachMember(directory.Get(), place.text, "*",
+                          [&](const Place& member) { total += RemoveAt(member, 1); });
         }
     }
-    if (Sys().rmdir(path) != 0 && errno == ENOTDIR) {
-        Sys().unlink(path);
+    if (Sys().unlinkat(place.directory, place.name, AT_REMOVEDIR) != 0 && errno == ENOTDIR) {
+        Sys().unlinkat(place.directory, place.name, 0);
     }
     return total;
 }
 
-int RemoveFile(const char* path)
+int RemoveFile(const Place& place)
 {
-    if (Sys().access(path, W_OK) != 0) {
-        Sys().chmod(path, kWritableByAll);
+    // The mode of a link is its target's: a link is never made writable.
+    if (Sys().faccessat(place.directory, place.name, W_OK, 0) != 0) {
+        Sys().fchmodat(place.directory, place.name, kWritableByAll, AT_SYMLINK_NOFOLLOW);
     }
-    if (Sys().unlink(path) != 0) {
+    if (Sys().unlinkat(place.directory, place.name, 0) != 0) {
         const int error = errno;
-        std::fprintf(stderr, "rvUnlink: Could not remove %s: %s (%d).\n", path,
+        std::fprintf(stderr, "rvUnlink: Could not remove %s: %s (%d).\n", place.text,
                      std::strerror(error), error);
         return 0;
     }
     return 1;
+}
+
+int RemoveAt(const Place& place, unsigned int recurse)
+{
+    if (IsWildcard(place.text)) {
+        return RemoveMatches(place, recurse);
+    }
+    if (Sys().faccessat(place.directory, place.name, F_OK, 0) != 0) {
+        return 0;
+    }
+    if (tessaline::files::IsDirectoryAt(place) == 1 && recurse == 1) {
+        return RemoveTree(place);
+    }
+    return RemoveFile(place);
 }
 
 }  // namespace
@@ -81,15 +121,6 @@ int rvUnlink(const char* path, unsigned int recurse)
     if (path == nullptr) {
         return 0;
     }
-    rvFilename name(path, 0);
-    if (std::strpbrk(path, "*?") != nullptr) {
-        return RemoveMatches(name, recurse);
-    }
-    if (Sys().access(name, F_OK) != 0) {
-        return 0;
-    }
-    if (rvFilename::IsDirectory(name) == 1 && recurse == 1) {
-        return RemoveTree(name);
-    }
-    return RemoveFile(name);
+    const rvFilename name(path, 0);
+    return RemoveAt(Place::Host(name), recurse);
 }

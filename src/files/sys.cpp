@@ -15,6 +15,16 @@ int OpenFile(const char* path, int flags, mode_t mode)
     return ::open(path, flags, mode);
 }
 
+int OpenFileAt(int directory, const char* path, int flags, mode_t mode)
+{
+    return ::openat(directory, path, flags, mode);
+}
+
+int StatAt(int directory, const char* path, struct stat* info, int flags)
+{
+    return ::fstatat(directory, path, info, flags);
+}
+
 int StatPath(const char* path, struct stat* info)
 {
     return ::stat(path, info);
@@ -34,6 +44,7 @@ SysCalls g_sys = {
     OpenFile, ::close, ::read, ::write, ::lseek, StatHandle, StatPath, ::lockf,
     ::access, ::chmod, ::mkdir, ::unlink, ::rmdir, ::symlink, ::realpath, StatFileSystem,
     ::nanosleep, ::opendir, ::readdir, ::closedir, ::pathconf,
+    OpenFileAt, StatAt, ::faccessat, ::unlinkat, ::mkdirat, ::fchmodat, ::symlinkat, ::fdopendir,
 };
 
 }  // namespace

@@ -40,6 +40,15 @@ struct SysCalls {
     struct dirent* (*readdir)(DIR* dir);
     int (*closedir)(DIR* dir);
     long (*pathconf)(const char* path, int name);
+    // The same calls relative to an open directory, for the tree walks.
+    int (*openat)(int directory, const char* path, int flags, mode_t mode);
+    int (*fstatat)(int directory, const char* path, struct stat* info, int flags);
+    int (*faccessat)(int directory, const char* path, int mode, int flags);
+    int (*unlinkat)(int directory, const char* path, int flags);
+    int (*mkdirat)(int directory, const char* path, mode_t mode);
+    int (*fchmodat)(int directory, const char* path, mode_t mode, int flags);
+    int (*symlinkat)(const char* existing, int directory, const char* created);
+    DIR* (*fdopendir)(int fd);
 };
 
 // The live table. Tests reach it by linking the library's objects

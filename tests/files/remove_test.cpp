@@ -77,14 +77,13 @@ TEST(Unlink, FailedMembersAreReportedAndSkipped)
     Put(dir / "t/stuck", "1");
     Put(dir / "t/free", "2");
     ScopedSysCalls restore;
-    static const auto realUnlink = Sys().unlink;
-    Sys().unlink = [](const char* path) {
-        const std::string name = path;
-        if (name.size() > 6 && name.compare(name.size() - 6, 6, "/stuck") == 0) {
+    static const auto realUnlink = Sys().unlinkat;
+    Sys().unlinkat = [](int directory, const char* name, int flags) {
+        if (std::strcmp(name, "stuck") == 0) {
             errno = EACCES;
             return -1;
         }
-        return realUnlink(path);
+        return realUnlink(directory, name, flags);
     };
     CaptureStderr capture;
     EXPECT_EQ(1, rvUnlink((dir / "t").c_str(), 1));

@@ -18,6 +18,27 @@
 /// independent. A tree that changes during a walk gives what the platform's
 /// directory reading delivers. Recursion depth follows the depth of the tree,
 /// with a 16 KiB copy buffer on the stack of each level.
+///
+/// Hostile trees. The path the host names (for a wildcard, its directory) is
+/// resolved as given. Everything below it is reached through the open
+/// descriptor of the directory it was listed in, never by its path text
+/// again, so renaming a directory or swapping it for a symbolic link while a
+/// call works cannot lead the call anywhere else:
+/// - rvUnlink enters directories only with O_NOFOLLOW. A link, planted or
+///   swapped in, is removed as a link and what it leads to stays, even where
+///   removing the link fails. A read-only file is made writable only when it
+///   is no link (the mode of a link is its target's, elsewhere).
+/// - The copy reads through the links it finds on the source side, as it
+///   always did, but `move` removes only files that were not reached through
+///   a link to a directory: those are copied, counted and left in place.
+/// - Below the target the host names, the copy never writes through a link:
+///   a link at a member's target name fails that member (0), and a link
+///   where a target directory should be takes none of its members.
+/// - Member names are formed as rvFilename forms them. A name whose text
+///   form leads out of its directory is left alone and counts 0, silently:
+///   "..." reads as ".." with an empty extension, a backslash as "/". A member
+///   whose full text passes the platform's path limit is left alone too, as a
+///   call by that text would fail.
 #ifndef TESSALINE_FILES_RVCOPY_H
 #define TESSALINE_FILES_RVCOPY_H
 
@@ -61,7 +82,15 @@
 ///   copy), a short write that cannot be completed, or a target that fails to
 ///   close fails the copy.
 /// A failed copy removes the target it opened, even an older one it
-/// truncated, and never removes the source.
+/// truncated, and never removes the source. So a copy that fails after the
+/// target was opened (a full disk, a file size limit, a failing read, write or
+/// close) loses the old content of a target it replaces: the target is
+/// truncated in place when opened, which keeps its inode, owner, mode and hard
+/// links, and then removed. Where that removal itself fails (a read-only
+/// directory), the truncated, partly written target stays. Failures before
+/// the target is opened (missing or unreadable source, refused scheme, an
+/// up-to-date target, a directory that cannot be made, a target that cannot
+/// be opened) leave the target byte for byte.
 TESSALINE_API int rvCopyFile(const char* source, const char* target, unsigned int recurse,
                              unsigned int overwrite, unsigned int link, unsigned int move,
                              const char* aux1, const char* aux2, unsigned long mode);
@@ -75,7 +104,9 @@ TESSALINE_API int rvCopyFile(const char* source, const char* target, unsigned in
 /// "rvUnlink: Could not remove <path>: <platform text> (<errno>).", and adds 0;
 /// so does a directory given with `recurse` other than 1. Missing paths and
 /// directories that stay (not empty) are silent. A dangling symbolic link
-/// counts as missing and stays. A null `path` removes nothing.
+/// counts as missing and stays. A null `path` removes nothing. A directory
+/// named by the host that turns out to be a link when it is opened is not
+/// entered (see "Hostile trees").
 TESSALINE_API int rvUnlink(const char* path, unsigned int recurse);
 
 /// 1 when every entry under `first` has an entry of the same name, kind and
