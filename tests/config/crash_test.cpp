@@ -2,11 +2,11 @@
 // moments. Whatever the moment, a whole file, the old one or the new one,
 // stands under the configuration's name.
 #include <chrono>
+#include <memory>
 #include <random>
 #include <string>
 #include <thread>
 
-#include <fcntl.h>
 #include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -23,7 +23,7 @@ using tessaline::test::TempDir;
 constexpr int kSections = 10;
 constexpr int kKeysPerSection = 100;
 constexpr int kKillsPerMode = 200;
-constexpr int kCalibrationFlushes = 5;
+constexpr int kCalibrationRewrites = 5;
 constexpr std::chrono::seconds kTimeLimit(60);
 
 // Every key of the file takes a value of the set: 0 or 1.
@@ -62,16 +62,12 @@ std::string body(const std::string& text)
     return text.substr(0, last);
 }
 
-// Runs in the child: loads, says so on `readyFd`, and rewrites the file
-// with the two value sets in turn until it is killed.
-[[noreturn]] void rewriteUntilKilled(const std::string& path, unsigned int backups, int readyFd)
+// Runs in the child, on the parent's loaded object: rewrites the file with
+// the two value sets in turn until it is killed.
+[[noreturn]] void rewriteUntilKilled(rvConfig& config, unsigned int backups)
 {
     rvConfig::m_bBackups = backups;
-    rvConfig config(path.c_str(), rvConfig::OpenUpdate);
-    if (write(readyFd, "r", 1) != 1) {
-        _exit(1);
-    }
-    for (int set = 0;; set ^= 1) {
+    for (int set = 1;; set ^= 1) {
         storeSet(config, set);
         config.Flush(0);
     }
@@ -81,15 +77,14 @@ class CrashTest : public ::testing::TestWithParam<unsigned int> {
 protected:
     void SetUp() override
     {
-        m_path = m_dir.Write("app.ini", initialFile());
-        rvConfig config(m_path.c_str(), rvConfig::OpenUpdate);
+        m_config = std::make_unique<rvConfig>(m_dir.Write("app.ini", initialFile()).c_str(), rvConfig::OpenUpdate);
         const auto start = std::chrono::steady_clock::now();
-        for (int i = 0; i < kCalibrationFlushes; ++i) {
-            storeSet(config, i % 2);
-            ASSERT_EQ(config.Flush(0), 1u);
+        for (int i = 0; i < kCalibrationRewrites; ++i) {
+            storeSet(*m_config, i % 2);
+            ASSERT_EQ(m_config->Flush(0), 1u);
             m_sets[i % 2] = body(m_dir.Read("app.ini"));
         }
-        m_flushTime = (std::chrono::steady_clock::now() - start) / kCalibrationFlushes;
+        m_rewriteTime = (std::chrono::steady_clock::now() - start) / kCalibrationRewrites;
         ASSERT_FALSE(m_sets[0].empty());
         ASSERT_FALSE(m_sets[1].empty());
     }
@@ -100,41 +95,37 @@ protected:
         return text == m_sets[0] || text == m_sets[1];
     }
 
-    // Starts a rewriting child, kills it after a random delay of up to two
-    // rewrites, and waits for it.
+    // Starts a rewriting child, kills it at a random moment of its first
+    // rewrite, and waits for it.
     void killOneChild(unsigned int backups, std::mt19937& random)
     {
-        int ready[2];
-        ASSERT_EQ(pipe2(ready, O_CLOEXEC), 0);
+        const long longest = std::chrono::duration_cast<std::chrono::microseconds>(m_rewriteTime).count();
+        const std::chrono::microseconds delay(std::uniform_int_distribution<long>(0, longest)(random));
         const pid_t child = fork();
         ASSERT_NE(child, -1);
         if (child == 0) {
-            close(ready[0]);
-            rewriteUntilKilled(m_path, backups, ready[1]);
+            rewriteUntilKilled(*m_config, backups);
         }
-        close(ready[1]);
-        char byte;
-        const bool loaded = read(ready[0], &byte, 1) == 1;
-        close(ready[0]);
-        std::uniform_int_distribution<long> delay(0, 2 * std::chrono::duration_cast<std::chrono::microseconds>(m_flushTime).count());
-        std::this_thread::sleep_for(std::chrono::microseconds(delay(random)));
+        std::this_thread::sleep_for(delay);
         kill(child, SIGKILL);
         int status = 0;
         ASSERT_EQ(waitpid(child, &status, 0), child);
-        ASSERT_TRUE(loaded);
         ASSERT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL);
     }
 
     TempDir m_dir;
-    std::string m_path;
+    // Loaded once; each child rewrites with its own copy.
+    std::unique_ptr<rvConfig> m_config;
     std::string m_sets[2];
-    std::chrono::steady_clock::duration m_flushTime{};
+    std::chrono::steady_clock::duration m_rewriteTime{};
 };
 
 TEST_P(CrashTest, KilledRewriteLeavesAWholeFileUnderItsName)
 {
     const unsigned int backups = GetParam();
-    std::mt19937 random(::testing::UnitTest::GetInstance()->random_seed());
+    const unsigned int seed = std::random_device()();
+    SCOPED_TRACE("seed " + std::to_string(seed));
+    std::mt19937 random(seed);
     const auto deadline = std::chrono::steady_clock::now() + kTimeLimit;
     int kills = 0;
     for (; kills < kKillsPerMode && std::chrono::steady_clock::now() < deadline; ++kills) {
@@ -144,6 +135,9 @@ TEST_P(CrashTest, KilledRewriteLeavesAWholeFileUnderItsName)
         }
         ASSERT_TRUE(whole("app.ini")) << "after kill " << kills << ", " << m_dir.Read("app.ini").size()
                                       << " bytes under the name";
+        if (backups != 0 && m_dir.Exists("app.bak")) {
+            ASSERT_TRUE(whole("app.bak")) << "after kill " << kills;
+        }
     }
     EXPECT_EQ(kills, kKillsPerMode) << "too slow: the time limit ended the test";
     RecordProperty("kills", kills);
