@@ -25,7 +25,7 @@ int rvConfig::GetValue(const char* key, int def, const char* section)
     if (FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) == 0) {
         return def;
     }
-    // long is 64 bits here; clamp to what a 32-bit strtol gives.
+    // Where long is 64 bits wide, clamp to what a 32-bit strtol gives.
     const long number = std::strtol(value.c_str(), nullptr, 10);
     if (number > INT_MAX) {
         return INT_MAX;

@@ -3,9 +3,8 @@
 // thread must key from a complete table. Nothing else in this executable
 // keys a cipher before this test.
 #include <atomic>
-#include <cstring>
+#include <string>
 #include <thread>
-#include <vector>
 
 #include <gtest/gtest.h>
 
@@ -15,24 +14,22 @@
 TEST(MdsTable, FirstKeyingFromManyThreads)
 {
     ASSERT_EQ(1, __atomic_load_n(&needToBuildMDS, __ATOMIC_ACQUIRE)) << "table already built";
-
     constexpr int kThreads = 8;
     std::atomic<int> waiting{kThreads};
-    std::vector<std::string> results(kThreads);
-    std::vector<std::thread> threads;
+    std::string results[kThreads];
+    std::thread threads[kThreads];
     for (int t = 0; t < kThreads; ++t) {
-        threads.emplace_back([&, t] {
-            waiting.fetch_sub(1);
-            while (waiting.load() > 0)
+        threads[t] = std::thread([&, t] {
+            for (waiting.fetch_sub(1); waiting.load() > 0;)
                 std::this_thread::yield();
+            // Half key the engine directly, half through the text form.
+            unsigned char block[16] = {};
             if (t % 2 == 0) {
-                keyInstance key;
-                std::memset(&key, 0, sizeof key);
+                keyInstance key = {};
                 makeKey(&key, DIR_ENCRYPT, 128, nullptr);
                 reKey(&key);
                 cipherInstance cipher;
                 cipherInit(&cipher, MODE_ECB, nullptr);
-                unsigned char block[16] = {};
                 blockEncrypt(&cipher, &key, block, 128, block);
                 results[t] = std::string(reinterpret_cast<char*>(block), 16);
             } else {
@@ -47,9 +44,7 @@ TEST(MdsTable, FirstKeyingFromManyThreads)
         thread.join();
 
     EXPECT_EQ(0, __atomic_load_n(&needToBuildMDS, __ATOMIC_ACQUIRE));
-    const std::string zeroKeyBlock =
-        "\xA2\xFB\x66\x0C\x9A\x92\xBA\xF3\x45\x29\xFD\x18\xD9\x9B\x81\xAE";
+    const std::string zeroKeyBlock = "\xA2\xFB\x66\x0C\x9A\x92\xBA\xF3\x45\x29\xFD\x18\xD9\x9B\x81\xAE";
     for (int t = 0; t < kThreads; ++t)
-        EXPECT_EQ(t % 2 == 0 ? zeroKeyBlock : "D9F35E45F0B32BB01E0F8FA0FC5041E80CAB", results[t])
-            << "thread " << t;
+        EXPECT_EQ(t % 2 == 0 ? zeroKeyBlock : "D9F35E45F0B32BB01E0F8FA0FC5041E80CAB", results[t]) << t;
 }

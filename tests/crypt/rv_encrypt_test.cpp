@@ -21,17 +21,19 @@ std::string Encrypt(std::string payload)
 
 struct Decrypted {
     int result;
-    std::string bytes;  // `length` bytes of out
     unsigned long length;
     unsigned int wasPlain;
+    std::string bytes;  // the first `length` bytes of out
+    std::string text;   // out up to its NUL, if it has one within the capacity
 };
 
 Decrypted Decrypt(std::string text, unsigned long capacity = 256)
 {
-    std::vector<unsigned char> out(capacity + 1, 0xEE);
-    Decrypted d{0, "", capacity, 7};
-    d.result = rvDecrypt(&text[0], out.data(), &d.length, &d.wasPlain);
-    d.bytes.assign(reinterpret_cast<char*>(out.data()), d.length <= capacity ? d.length : 0);
+    std::vector<char> out(capacity + 1, '\xEE');
+    Decrypted d{0, capacity, 7, "", ""};
+    d.result = rvDecrypt(&text[0], reinterpret_cast<unsigned char*>(out.data()), &d.length, &d.wasPlain);
+    d.bytes.assign(out.data(), d.length <= capacity ? d.length : 0);
+    d.text.assign(out.data(), strnlen(out.data(), out.size()));
     return d;
 }
 
@@ -50,12 +52,20 @@ TEST(RvEncrypt, KnownTextAndBlockCounts)
     // Zero filler: one value always gives one text.
     EXPECT_EQ(Encrypt("a"), Encrypt("a"));
 
-    char out[4] = "zzz";
-    unsigned char data[1] = {'q'};
-    EXPECT_EQ(1, rvEncrypt(data, 0, out));
-    EXPECT_STREQ("", out);
-    EXPECT_EQ(0, rvEncrypt(nullptr, 1, out));
-    EXPECT_EQ(0, rvEncrypt(data, 1, nullptr));
+    // The plain-named forms pass their arguments through.
+    unsigned char hello[] = "Hello World!";
+    char text[64];
+    EXPECT_EQ(1, RVUI_Encrypt(hello, 12, text));
+    EXPECT_STREQ("D9F35E45F0B32BB01E0F8FA0FC5041E80CAB", text);
+    unsigned char opened[16] = {};
+    unsigned long length = 15;
+    EXPECT_EQ(1, RVUI_Decrypt(text, opened, &length, nullptr));
+    EXPECT_STREQ("Hello World!", reinterpret_cast<char*>(opened));
+    EXPECT_EQ(12ul, length);
+    EXPECT_EQ(1, rvEncrypt(hello, 0, text));
+    EXPECT_STREQ("", text);
+    EXPECT_EQ(0, rvEncrypt(nullptr, 1, text));
+    EXPECT_EQ(0, rvEncrypt(hello, 1, nullptr));
 }
 
 TEST(RvDecrypt, EncryptedTextComesBackExactly)
@@ -89,49 +99,31 @@ TEST(RvDecrypt, EncryptedTextComesBackExactly)
 
 TEST(RvDecrypt, ClearAndEmptyText)
 {
-    Decrypted d = Decrypt("hello");
-    EXPECT_EQ(1, d.result);
-    EXPECT_EQ("hello", d.bytes);
-    EXPECT_EQ(1u, d.wasPlain);
-
-    {
-        std::string text = "hello";
-        unsigned char out[8];
-        std::memset(out, 0xEE, sizeof out);
-        unsigned long length = 3;
-        unsigned int wasPlain = 0;
-        EXPECT_EQ(1, rvDecrypt(&text[0], out, &length, &wasPlain));
-        EXPECT_STREQ("he", reinterpret_cast<char*>(out));
-        EXPECT_EQ(3ul, length);
-        EXPECT_EQ(1u, wasPlain);
-        for (unsigned long capacity : {0ul, 1ul}) {
-            length = capacity;
-            out[0] = 'x';
-            EXPECT_EQ(1, rvDecrypt(&text[0], out, &length, nullptr));
-            EXPECT_EQ('\0', out[0]);
-            EXPECT_EQ(capacity, length);
-        }
-        length = 6;
-        EXPECT_EQ(1, rvDecrypt(&text[0], out, &length, nullptr));
-        EXPECT_STREQ("hello", reinterpret_cast<char*>(out));
-        EXPECT_EQ(5ul, length);
+    struct Case {
+        const char* text;
+        unsigned long capacity;
+        const char* expected;
+        unsigned long length;
+    };
+    const Case cases[] = {
+        {"hello", 256, "hello", 5},
+        {"hello", 6, "hello", 5},
+        {"hello", 3, "he", 3},  // cut short: the length stays the capacity
+        {"hello", 1, "", 1},
+        {"hello", 0, "", 0},
+        {"", 99, "", 99},
+        // Marked-looking text without the head, of the wrong length or short.
+        {"X900000000000000000000000000000000AB", 256, "X900000000000000000000000000000000AB", 36},
+        {"D90000000000000000000000000000000AB", 256, "D90000000000000000000000000000000AB", 35},
+        {"D9AB", 256, "D9AB", 4},
+    };
+    for (const Case& c : cases) {
+        const Decrypted d = Decrypt(c.text, c.capacity);
+        EXPECT_EQ(1, d.result) << c.text << " into " << c.capacity;
+        EXPECT_EQ(c.expected, d.text) << c.text << " into " << c.capacity;
+        EXPECT_EQ(c.length, d.length) << c.text << " into " << c.capacity;
+        EXPECT_EQ(1u, d.wasPlain) << c.text << " into " << c.capacity;
     }
-    {
-        char empty[] = "";
-        unsigned char out[2] = {'x', 'y'};
-        unsigned long length = 99;
-        unsigned int wasPlain = 0;
-        EXPECT_EQ(1, rvDecrypt(empty, out, &length, &wasPlain));
-        EXPECT_EQ('\0', out[0]);
-        EXPECT_EQ(99ul, length);
-        EXPECT_EQ(1u, wasPlain);
-    }
-    // 36 characters without the head, or of the wrong length, are clear text.
-    const std::string unmarked = "X9" + std::string(32, '0') + "AB";
-    EXPECT_EQ(unmarked, Decrypt(unmarked).bytes);
-    const std::string shortMark = "D9" + std::string(31, '0') + "AB";
-    EXPECT_EQ(shortMark, Decrypt(shortMark).bytes);
-    EXPECT_EQ("D9AB", Decrypt("D9AB").bytes);
 }
 
 TEST(RvDecrypt, ChainedText)
@@ -148,20 +140,13 @@ TEST(RvDecrypt, ChainedText)
     EXPECT_NE(std::string(80, 'z'), Decrypt(std::string(80, 'z')).bytes);
 
     // A pair that isn't hex takes strtoul's value: "G1" reads as 0, " F" as 15.
-    EXPECT_EQ(Decrypt(Chained("00000000G1")).bytes, "");
-    EXPECT_EQ(Decrypt(Chained("00000000 F")).bytes, "\x0F");
+    EXPECT_EQ("", Decrypt(Chained("00000000G1")).bytes);
+    EXPECT_EQ("\x0F", Decrypt(Chained("00000000 F")).bytes);
 
     // 36 characters at most, always terminated.
-    std::string full;
-    for (int i = 0; i < 39; ++i)
-        full += "00";
-    full += "41";
-    std::vector<unsigned char> out(64, 0xEE);
-    unsigned long length = 64;
-    EXPECT_EQ(1, rvDecrypt(&full[0], out.data(), &length, nullptr));
-    EXPECT_EQ(36ul, length);
-    EXPECT_EQ(std::string(36, 'A'), std::string(out.begin(), out.begin() + 36));
-    EXPECT_EQ('\0', out[36]);
+    d = Decrypt(std::string(78, '0') + "41", 64);
+    EXPECT_EQ(36ul, d.length);
+    EXPECT_EQ(std::string(36, 'A'), d.text);
 }
 
 TEST(TwoFishText, KeysAndRoundTrips)
@@ -221,15 +206,12 @@ TEST(TwoFishText, NullsAndMalformedTextAreSafe)
         copy.push_back('\0');
         length = sizeof out;
         EXPECT_EQ(1, TwoFishDecrypt(kKey128, copy.data(), out, &length)) << shape;
-        if (shape.size() < 32)
-            EXPECT_EQ(0ul, length) << shape;
-        else
-            EXPECT_EQ(std::string(data, data + 4), std::string(out, out + length)) << shape;
+        EXPECT_EQ(shape.size() < 32 ? std::string() : std::string(data, data + 4),
+                  std::string(out, out + length)) << shape;
     }
 
     // Non-hex digits and a wrong key still "succeed", within the buffers.
-    std::string garbled = "D9" + std::string(64, 'Q') + "AB";
-    Decrypted d = Decrypt(garbled, 1000);
+    const Decrypted d = Decrypt("D9" + std::string(64, 'Q') + "AB", 1000);
     EXPECT_EQ(1, d.result);
     EXPECT_LE(d.length, 60ul);
     length = sizeof out;
@@ -244,9 +226,7 @@ TEST(TwoFishText, LargePayloads)
         payload[i] = static_cast<char>(i * 7);
     const std::string text = Encrypt(payload);
     EXPECT_EQ(4u + 32u * ((payload.size() + 3) / 16 + 1), text.size());
-    Decrypted d = Decrypt(text, payload.size());
-    EXPECT_EQ(1, d.result);
-    EXPECT_TRUE(d.bytes == payload);
+    EXPECT_TRUE(Decrypt(text, payload.size()).bytes == payload);
 
     // A length whose bit count would overflow is refused before any read.
     unsigned char data[1] = {0};
@@ -271,19 +251,4 @@ TEST(TwoFishHere, ReturnsItsCallSite)
     const unsigned long start = reinterpret_cast<unsigned long>(&CallSite);
     EXPECT_GT(here, start);
     EXPECT_LT(here - start, 256ul) << "the return address lies inside the caller";
-}
-
-TEST(RvuiExports, PassArgumentsThrough)
-{
-    unsigned char data[] = "Hello World!";
-    char text[64];
-    EXPECT_EQ(1, RVUI_Encrypt(data, 12, text));
-    EXPECT_STREQ("D9F35E45F0B32BB01E0F8FA0FC5041E80CAB", text);
-    unsigned char out[16];
-    unsigned long length = sizeof out;
-    unsigned int wasPlain = 5;
-    EXPECT_EQ(1, RVUI_Decrypt(text, out, &length, &wasPlain));
-    EXPECT_EQ(12ul, length);
-    EXPECT_EQ(0u, wasPlain);
-    EXPECT_EQ(0, std::memcmp(out, data, 12));
 }

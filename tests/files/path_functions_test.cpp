@@ -7,6 +7,7 @@
 #include <sys/statvfs.h>
 #include <unistd.h>
 
+#include <filesystem>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -18,25 +19,19 @@ namespace {
 
 using tessaline::test::TempDir;
 
-bool IsDir(const std::string& path)
-{
-    struct stat info;
-    return stat(path.c_str(), &info) == 0 && S_ISDIR(info.st_mode);
-}
-
 TEST(CreateDir, AbsoluteNames)
 {
     TempDir tmp;
     mode_t savedMask = umask(022);
     EXPECT_EQ(CreateDir((tmp / "a/b/c").c_str(), 0), 1);
     umask(savedMask);
-    EXPECT_TRUE(IsDir(tmp / "a") && IsDir(tmp / "a/b") && IsDir(tmp / "a/b/c"));
+    EXPECT_TRUE(std::filesystem::is_directory(tmp / "a") && std::filesystem::is_directory(tmp / "a/b") && std::filesystem::is_directory(tmp / "a/b/c"));
     struct stat info;
     ASSERT_EQ(stat((tmp / "a/b/c").c_str(), &info), 0);
     EXPECT_EQ(info.st_mode & 0777, 0755u);
 
     EXPECT_EQ(CreateDir((tmp / "t/").c_str(), 0), 1);
-    EXPECT_TRUE(IsDir(tmp / "t"));
+    EXPECT_TRUE(std::filesystem::is_directory(tmp / "t"));
 
     // What exists counts as done; below a file nothing can be made.
     close(open((tmp / "file").c_str(), O_CREAT | O_WRONLY | O_CLOEXEC, 0600));
@@ -48,7 +43,7 @@ TEST(CreateDir, AbsoluteNames)
     for (int level = 0; level < 1000; ++level)
         deep += "/d";
     EXPECT_EQ(CreateDir(deep.c_str(), 0), 1);
-    EXPECT_TRUE(IsDir(deep));
+    EXPECT_TRUE(std::filesystem::is_directory(deep));
 }
 
 TEST(CreateDir, RelativeAndAwkwardNames)
@@ -61,14 +56,14 @@ TEST(CreateDir, RelativeAndAwkwardNames)
 
     EXPECT_EQ(CreateDir("newdir", 0), 0);
     EXPECT_EQ(CreateDir("old/new", 0), 1);
-    EXPECT_TRUE(IsDir("old/new"));
+    EXPECT_TRUE(std::filesystem::is_directory("old/new"));
     EXPECT_EQ(CreateDir("new1/new2", 0), 0);
     for (const std::string& name : {std::string(), std::string("://"), std::string("a\\b\\c"),
                                     std::string(10000, '\\'), tmp / std::string(10000, 'x')})
         EXPECT_EQ(CreateDir(name.c_str(), 0), 0) << name.substr(0, 80);
     EXPECT_EQ(CreateDir(nullptr, 0), 0);
     EXPECT_EQ(CreateDir("////", 0), 1);
-    EXPECT_FALSE(IsDir("newdir") || IsDir("new1") || IsDir("a\\b\\c"));
+    EXPECT_FALSE(std::filesystem::is_directory("newdir") || std::filesystem::is_directory("new1") || std::filesystem::is_directory("a\\b\\c"));
     ASSERT_EQ(chdir(saved), 0);
 }
 

@@ -28,98 +28,68 @@ bool FreeElsewhere(MMutex& mutex)
 
 }  // namespace
 
-TEST(MCondVar, TimeoutsBelowTwoSecondsEndWithinOneHoldingTheMutex)
+TEST(MCondVar, TimeoutsHaveAWholeSecondGrainAndEndHoldingTheMutex)
 {
-    MMutex mutex(MMutex_::MutexPlain);
-    MCondVar cond;
+    struct Case {
+        MMutex_::MutexType type;
+        long timeout;
+        double atLeast, atMost;
+    };
+    const Case cases[] = {
+        {MMutex_::MutexPlain, 1, 0, 1.1},
+        {MMutex_::MutexPlain, 1999, 0, 1.1},
+        {MMutex_::MutexRecursive, 2500, 0.99, 2.1},
+        {MMutex_::MutexRecursive, -1, 0, 0.5},  // at once, the mutex never released
+    };
     CaptureStderr capture;
-    for (long timeout : {1L, 1999L}) {
+    for (const Case& c : cases) {
+        MMutex mutex(c.type);
+        MCondVar cond;
         ASSERT_EQ(0, mutex.Lock(nullptr));
         int status = 0;
-        EXPECT_LE(SecondsFor([&] { status = cond.Wait(mutex, nullptr, timeout); }), 1.1) << timeout;
+        const double seconds = SecondsFor([&] { status = cond.Wait(mutex, nullptr, c.timeout); });
+        EXPECT_GE(seconds, c.atLeast) << c.timeout;
+        EXPECT_LE(seconds, c.atMost) << c.timeout;
         EXPECT_EQ(-5, status);
         EXPECT_EQ(ETIMEDOUT, cond.LastError());
         EXPECT_FALSE(FreeElsewhere(mutex));
         EXPECT_EQ(0, mutex.Unlock(nullptr));
+        EXPECT_TRUE(FreeElsewhere(mutex));
     }
     EXPECT_EQ("", capture.Text());
 }
 
-TEST(MCondVar, TimeoutOf2500EndsAfterOneSecondWithinTwo)
+TEST(MCondVar, WaiterGetsRecursiveMutexBackWithItsRecord)
 {
-    MMutex mutex(MMutex_::MutexPlain);
-    MCondVar cond;
-    ASSERT_EQ(0, mutex.Lock(nullptr));
-    int status = 0;
-    const double seconds = SecondsFor([&] { status = cond.Wait(mutex, nullptr, 2500); });
-    EXPECT_EQ(-5, status);
-    EXPECT_GT(seconds, 0.99);
-    EXPECT_LE(seconds, 2.1);
-    EXPECT_EQ(0, mutex.Unlock(nullptr));
-}
-
-TEST(MCondVar, NegativeTimeoutIsAnImmediateTimeout)
-{
-    MMutex mutex(MMutex_::MutexRecursive);
-    MCondVar cond;
-    ASSERT_EQ(0, mutex.Lock(nullptr));
-    int status = 0;
-    EXPECT_LT(SecondsFor([&] { status = cond.Wait(mutex, nullptr, -1); }), 0.5);
-    EXPECT_EQ(-5, status);
-    EXPECT_FALSE(FreeElsewhere(mutex));
-    EXPECT_EQ(0, mutex.Unlock(nullptr));
-    EXPECT_EQ(3, mutex.Unlock(nullptr));
-}
-
-TEST(MCondVar, SignalledWaiterGetsRecursiveMutexBackWithItsCount)
-{
-    MMutex mutex(MMutex_::MutexRecursive);
-    MCondVar cond;
-    bool ready = false;
-    ASSERT_EQ(0, mutex.Lock(nullptr));
-    ASSERT_EQ(0, mutex.Lock(nullptr));
-    // Passes through the mutex while the waiter sleeps: possible only because
-    // the wait releases it fully, count 2 notwithstanding.
-    std::thread other([&] {
-        EXPECT_EQ(0, mutex.Lock(nullptr));
-        ready = true;
-        EXPECT_EQ(0, cond.Signal(nullptr));
+    for (bool signalled : {true, false}) {
+        MMutex mutex(MMutex_::MutexRecursive);
+        MCondVar cond;
+        bool passed = false;
+        ASSERT_EQ(0, mutex.Lock(nullptr));
+        ASSERT_EQ(0, mutex.Lock(nullptr));
+        // Passes through the mutex while the waiter sleeps: possible only
+        // because the wait releases it fully, count 2 notwithstanding.
+        std::thread other([&] {
+            EXPECT_EQ(0, mutex.Lock(nullptr));
+            passed = true;
+            EXPECT_EQ(0, signalled ? cond.Signal(nullptr) : 0);
+            EXPECT_EQ(0, mutex.Unlock(nullptr));
+        });
+        // Unsignalled, every wait times out; at least one had the other
+        // thread pass through and clear the record.
+        while (!passed) {
+            ASSERT_EQ(signalled ? 0 : -5, cond.Wait(mutex, nullptr, signalled ? 0 : 1));
+        }
+        other.join();
+        EXPECT_EQ(static_cast<unsigned long>(pthread_self()), mutex.m_owner);
+        EXPECT_EQ(2, mutex.m_count);
+        EXPECT_EQ(1, mutex.Locked());
         EXPECT_EQ(0, mutex.Unlock(nullptr));
-    });
-    while (!ready) {
-        ASSERT_EQ(0, cond.Wait(mutex, nullptr, 0));
-    }
-    other.join();
-    EXPECT_EQ(static_cast<unsigned long>(pthread_self()), mutex.m_owner);
-    EXPECT_EQ(2, mutex.m_count);
-    EXPECT_EQ(1, mutex.Locked());
-    EXPECT_EQ(0, mutex.Unlock(nullptr));
-    EXPECT_FALSE(FreeElsewhere(mutex));
-    EXPECT_EQ(0, mutex.Unlock(nullptr));
-    EXPECT_TRUE(FreeElsewhere(mutex));
-}
-
-TEST(MCondVar, TimedOutWaiterIsTheRecordedHolderAgain)
-{
-    MMutex mutex(MMutex_::MutexRecursive);
-    MCondVar cond;
-    bool passed = false;
-    ASSERT_EQ(0, mutex.Lock(nullptr));
-    std::thread other([&] {
-        EXPECT_EQ(0, mutex.Lock(nullptr));
-        passed = true;
+        EXPECT_FALSE(FreeElsewhere(mutex));
         EXPECT_EQ(0, mutex.Unlock(nullptr));
-    });
-    // Nobody signals: every wait times out, and at least one had the other
-    // thread pass through and clear the record.
-    while (!passed) {
-        ASSERT_EQ(-5, cond.Wait(mutex, nullptr, 1));
+        EXPECT_TRUE(FreeElsewhere(mutex));
+        EXPECT_EQ(3, mutex.Unlock(nullptr));
     }
-    other.join();
-    EXPECT_EQ(static_cast<unsigned long>(pthread_self()), mutex.m_owner);
-    EXPECT_EQ(1, mutex.m_count);
-    EXPECT_EQ(0, mutex.Unlock(nullptr));
-    EXPECT_EQ(3, mutex.Unlock(nullptr));
 }
 
 TEST(MCondVar, CancelledWaiterLeavesCheckedMutexFree)

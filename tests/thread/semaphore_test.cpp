@@ -10,32 +10,25 @@
 
 using tessaline::test::CaptureStderr;
 
-TEST(MSemaphore, CountsTakesAndGivesBack)
+TEST(MSemaphore, CountsTakesAndGivesBackUpTo32767)
 {
+    // The thread objects' semaphore is made when the library loads.
+    EXPECT_EQ(64, MThread::m_thrdSemaphore.Count());
+
     MSemaphore semaphore(3, 0);
     EXPECT_EQ(0, semaphore.Wait());
-    EXPECT_EQ(2, semaphore.Count());
     EXPECT_EQ(0, semaphore.Try());
+    EXPECT_EQ(1, semaphore.Count());
     EXPECT_EQ(0, semaphore.Signal());
-    EXPECT_EQ(2, semaphore.Count());
     MSemaphore::Cleanup(&semaphore.m_sem);
     EXPECT_EQ(3, semaphore.Count());
-}
 
-TEST(MSemaphore, CountIsLimitedTo32767)
-{
-    MSemaphore semaphore(100000, 0);
-    EXPECT_EQ(32767, semaphore.Count());
     EXPECT_EQ(0, semaphore.Init(32768));
     EXPECT_EQ(32767, semaphore.Count());
-    EXPECT_EQ(0, semaphore.Init(1));
-    EXPECT_EQ(1, semaphore.Count());
-}
+    EXPECT_EQ(32767, MSemaphore(100000, 0).Count());
 
-TEST(MSemaphore, TryOnEmptySemaphoreFailsSilently)
-{
-    MSemaphore semaphore(1, 0);
-    ASSERT_EQ(0, semaphore.Try());
+    // An empty semaphore refuses Try silently.
+    EXPECT_EQ(0, semaphore.Init(0));
     CaptureStderr capture;
     EXPECT_EQ(-1, semaphore.Try());
     EXPECT_EQ(EAGAIN, semaphore.LastError());
@@ -45,19 +38,17 @@ TEST(MSemaphore, TryOnEmptySemaphoreFailsSilently)
 TEST(MSemaphore, NoPlatformObjectUntilInit)
 {
     MSemaphore semaphore(0, 0);
-    EXPECT_EQ(-1, semaphore.Count());
     {
         CaptureStderr capture;
+        EXPECT_EQ(-1, semaphore.Count());
         EXPECT_EQ(-1, semaphore.Try());
         EXPECT_EQ(-1, semaphore.Signal());
         EXPECT_EQ(EINVAL, semaphore.LastError());
         EXPECT_EQ(-1, semaphore.Init(-1));
-        EXPECT_EQ(EINVAL, semaphore.LastError());
         EXPECT_EQ(-1, semaphore.Count());
         EXPECT_NE(std::string::npos, capture.Text().find("(22)\n"));
     }
     EXPECT_EQ(0, semaphore.Init(0));
-    EXPECT_EQ(0, semaphore.Count());
     EXPECT_EQ(0, semaphore.Signal());
     EXPECT_EQ(1, semaphore.Count());
 }
@@ -81,10 +72,4 @@ TEST(MSemaphore, WaitOutlastsAnInterruptingSignal)
     EXPECT_EQ(0, status);
     EXPECT_EQ(0, semaphore.Count());
     sigaction(SIGUSR1, &previous, nullptr);
-}
-
-TEST(MSemaphore, ThreadSemaphoreIsReadyWithSixtyFour)
-{
-    EXPECT_EQ(64, MThread::m_thrdSemaphore.Count());
-    EXPECT_EQ(64, MThread_::m_maxThreadCnt);
 }

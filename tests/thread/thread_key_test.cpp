@@ -21,40 +21,27 @@ void RememberExitValue(void* value)
 
 }  // namespace
 
-TEST(MThreadKey, EachThreadSeesItsOwnValue)
-{
-    MThreadKey key;
-    ASSERT_EQ(0, key.Create(nullptr, 0, nullptr));
-    int mine = 1;
-    int theirs = 2;
-    EXPECT_EQ(nullptr, key.GetValue(nullptr));
-    EXPECT_EQ(0, key.SetValue(&mine, nullptr));
-    EXPECT_EQ(nullptr, OnOtherThread([&] { return key.GetValue(nullptr); }));
-    EXPECT_EQ(&theirs, OnOtherThread([&] {
-        key.SetValue(&theirs, nullptr);
-        return key.GetValue(nullptr);
-    }));
-    EXPECT_EQ(&mine, key.GetValue(nullptr));
-}
-
-TEST(MThreadKey, DestructorGetsTheValueAtThreadExit)
-{
-    MThreadKey key;
-    ASSERT_EQ(0, key.Create(reinterpret_cast<void (*)()>(&RememberExitValue), 0, nullptr));
-    int value = 7;
-    std::thread([&] { key.SetValue(&value, nullptr); }).join();
-    EXPECT_EQ(&value, g_exitValue);
-}
-
-TEST(MThreadKey, DeletesItsKeyWhateverItsNumberAndRefusesWithoutOne)
+TEST(MThreadKey, EachThreadSeesItsOwnValueAndItsDestructorGetsIt)
 {
     unsigned int number = 0;
     {
         MThreadKey key;
-        ASSERT_EQ(0, key.Create(nullptr, 0, nullptr));
+        ASSERT_EQ(0, key.Create(reinterpret_cast<void (*)()>(&RememberExitValue), 0, nullptr));
         number = key;
+        int mine = 1;
+        int theirs = 2;
+        EXPECT_EQ(nullptr, key.GetValue(nullptr));
+        EXPECT_EQ(0, key.SetValue(&mine, nullptr));
+        EXPECT_EQ(nullptr, OnOtherThread([&] { return key.GetValue(nullptr); }));
+        EXPECT_EQ(&theirs, OnOtherThread([&] {
+            key.SetValue(&theirs, nullptr);
+            return key.GetValue(nullptr);
+        }));
+        EXPECT_EQ(&theirs, g_exitValue);
+        EXPECT_EQ(&mine, key.GetValue(nullptr));
     }
-    // The platform hands out the lowest free key: ours again, 0 included.
+    // The object deleted its key, whatever its number (0 included): the
+    // platform hands out the lowest free key, ours again.
     pthread_key_t next;
     ASSERT_EQ(0, pthread_key_create(&next, nullptr));
     EXPECT_EQ(number, next);

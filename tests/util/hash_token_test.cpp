@@ -2,76 +2,47 @@
 
 #include "tessaline/util/HashToken.h"
 
-namespace {
-
-// The same rows as the library's own URL scheme table.
-_tokenHash g_schemes[] = {{"file", 0}, {"ftp", 1}, {"http", 2}};
-
-// Sorted, with names that are prefixes of the next ones.
-_tokenHash g_nested[] = {{"a", 10}, {"ab", 11}, {"abc", 12}, {"b", 20}, {"ba", 21}};
-
-}  // namespace
-
-TEST(HashToken, ExactSearch)
+TEST(HashToken, ExactAndLooseSearch)
 {
-    EXPECT_EQ(1, HashToken("FTP", g_schemes, 2, 0, 1));
-    EXPECT_EQ(2, HashToken("http", g_schemes, 2, 0, 1));
-    EXPECT_EQ(0, HashToken("File", g_schemes, 2, 0, 1));
-    EXPECT_EQ(-1, HashToken("https", g_schemes, 2, 0, 1));
-    EXPECT_EQ(-1, HashToken("ht", g_schemes, 2, 0, 1));
-    EXPECT_EQ(-1, HashToken("", g_schemes, 2, 0, 1));
-
+    // The library's own scheme rows, and sorted names that are prefixes of the next ones.
+    _tokenHash schemes[] = {{"file", 0}, {"ftp", 1}, {"http", 2}};
+    _tokenHash nested[] = {{"a", 10}, {"ab", 11}, {"abc", 12}, {"b", 20}, {"ba", 21}};
     _tokenHash duplicates[] = {{"x", 1}, {"X", 2}, {"y", 3}};
-    EXPECT_EQ(1, HashToken("x", duplicates, 2, 0, 1));
-    EXPECT_EQ(2, HashToken("x", duplicates, 2, 1, 1));
-}
-
-TEST(HashToken, LooseSearchTakesTheLongestPrefix)
-{
-    EXPECT_EQ(2, HashToken("https", g_schemes, 2, 0, 0));
-    EXPECT_EQ(0, HashToken("FILES", g_schemes, 2, 0, 0));
-    EXPECT_EQ(1, HashToken("ftp://host", g_schemes, 2, 0, 0));
-    EXPECT_EQ(-1, HashToken("ht", g_schemes, 2, 0, 0));
-    EXPECT_EQ(-1, HashToken("gopher", g_schemes, 2, 0, 0));
-
-    EXPECT_EQ(12, HashToken("abcd", g_nested, 4, 0, 0));
-    EXPECT_EQ(11, HashToken("AB", g_nested, 4, 0, 0));
-    EXPECT_EQ(10, HashToken("a", g_nested, 4, 0, 0));
-    EXPECT_EQ(10, HashToken("ax", g_nested, 4, 0, 0));
-    EXPECT_EQ(21, HashToken("bat", g_nested, 4, 0, 0));
-    EXPECT_EQ(-1, HashToken("c", g_nested, 4, 0, 0));
-
     _tokenHash withEmpty[] = {{"", 5}, {"x", 6}};
-    EXPECT_EQ(5, HashToken("anything", withEmpty, 1, 0, 0));
-    EXPECT_EQ(6, HashToken("xyz", withEmpty, 1, 0, 0));
-}
+    struct Case {
+        const char* token;
+        _tokenHash* table;
+        int high, low, exact, loose;
+    };
+    const Case cases[] = {
+        {"FTP", schemes, 2, 0, 1, 1},
+        {"https", schemes, 2, 0, -1, 2},
+        {"ht", schemes, 2, 0, -1, -1},
+        {"AB", nested, 4, 0, 11, 11},
+        {"abcd", nested, 4, 0, -1, 12},  // the longest prefix wins
+        {"ax", nested, 4, 0, -1, 10},
+        {"bat", nested, 4, 0, -1, 21},   // row `high` is searched
+        {"c", nested, 4, 0, -1, -1},
+        {"x", duplicates, 2, 0, 1, 2},   // exact: the first; loose: the last
+        {"anything", withEmpty, 1, 0, -1, 5},
+        // The range limits both searches.
+        {"files", schemes, 2, 1, -1, -1},
+        {"http", schemes, 1, 0, -1, -1},
+        {"abcd", nested, 1, 0, -1, 11},
+        {"ftp", schemes, 1, 1, 1, 1},
+        // Bad arguments.
+        {nullptr, schemes, 2, 0, -1, -1},
+        {"ftp", nullptr, 2, 0, -1, -1},
+        {"ftp", schemes, 2, -1, -1, -1},
+        {"ftp", schemes, 0, 1, -1, -1},
+    };
+    for (const Case& c : cases) {
+        const char* token = c.token ? c.token : "(null)";
+        EXPECT_EQ(c.exact, HashToken(c.token, c.table, c.high, c.low, 1)) << token << " " << c.high << c.low;
+        EXPECT_EQ(c.loose, HashToken(c.token, c.table, c.high, c.low, 0)) << token << " " << c.high << c.low;
+    }
 
-TEST(HashToken, RangeLimitsBothModes)
-{
-    EXPECT_EQ(-1, HashToken("file", g_schemes, 2, 1, 1));
-    EXPECT_EQ(-1, HashToken("files", g_schemes, 2, 1, 0));
-    EXPECT_EQ(-1, HashToken("http", g_schemes, 1, 0, 1));
-    EXPECT_EQ(-1, HashToken("https", g_schemes, 1, 0, 0));
-    EXPECT_EQ(11, HashToken("abcd", g_nested, 1, 0, 0));
-    EXPECT_EQ(12, HashToken("abcd", g_nested, 4, 2, 0));
-
-    // A range of one row.
-    EXPECT_EQ(1, HashToken("ftp", g_schemes, 1, 1, 1));
-    EXPECT_EQ(1, HashToken("ftps", g_schemes, 1, 1, 0));
-    EXPECT_EQ(-1, HashToken("http", g_schemes, 1, 1, 1));
-}
-
-TEST(HashToken, BadArgumentsGiveMinusOne)
-{
-    EXPECT_EQ(-1, HashToken(nullptr, g_schemes, 2, 0, 1));
-    EXPECT_EQ(-1, HashToken("ftp", nullptr, 2, 0, 0));
-    EXPECT_EQ(-1, HashToken("ftp", g_schemes, 2, -1, 1));
-    EXPECT_EQ(-1, HashToken("ftp", g_schemes, 0, 1, 1));
-    EXPECT_EQ(-1, HashToken("ftp", g_schemes, 0, 1, 0));
-}
-
-TEST(HashToken, UnsortedLooseSearchStaysInRange)
-{
+    // An unsorted table gives some matching row or -1, and no read outside the range.
     _tokenHash unsorted[] = {{"zeta", 1}, {"alpha", 2}, {"al", 3}, {"mu", 4}, {"a", 5}};
     for (const char* token : {"alphabet", "zetas", "mu"}) {
         const int value = HashToken(token, unsorted, 4, 0, 0);

@@ -18,89 +18,53 @@ TEST(CaseCompare, IgnoresCaseAndOrdersNullFirst)
     EXPECT_EQ(0, _strnicmp("a", nullptr, 0));
 }
 
-TEST(CaseConvert, ConvertsInPlace)
+TEST(CaseConvert, ConvertsInPlaceAndLeavesHighBytes)
 {
-    char text[] = "Mixed Case 42!";
+    // A byte above 127 must not become a negative ctype index; the C locale
+    // leaves it as it is.
+    char text[] = "Mixed \xc4\xff 42!";
     EXPECT_EQ(text, _strlwr(text));
-    EXPECT_STREQ("mixed case 42!", text);
+    EXPECT_STREQ("mixed \xc4\xff 42!", text);
     EXPECT_EQ(text, _strupr(text));
-    EXPECT_STREQ("MIXED CASE 42!", text);
+    EXPECT_STREQ("MIXED \xc4\xff 42!", text);
     EXPECT_EQ(nullptr, _strlwr(nullptr));
+
+    for (int c = 0; c < 256; ++c) {
+        EXPECT_EQ(c >= 'A' && c <= 'Z' ? c + 32 : c, rv_lowerTable[c]) << c;
+    }
 }
 
-TEST(CaseConvert, HighBytesFollowTheLocale)
-{
-    // A byte above 127 must not be a negative ctype index; in the C locale
-    // it stays as it is.
-    char text[] = "A\xc4\xff";
-    _strlwr(text);
-    EXPECT_STREQ("a\xc4\xff", text);
-    _strupr(text);
-    EXPECT_STREQ("A\xc4\xff", text);
-}
-
-TEST(LowerTable, LowersOnlyAsciiLetters)
-{
-    EXPECT_EQ('a', rv_lowerTable[int('A')]);
-    EXPECT_EQ('z', rv_lowerTable[int('Z')]);
-    EXPECT_EQ('@', rv_lowerTable[int('@')]);
-    EXPECT_EQ('[', rv_lowerTable[int('[')]);
-    EXPECT_EQ(0xc4, rv_lowerTable[0xc4]);
-}
-
-TEST(SearchFirst, FindsTheFirstMatchInAnyCase)
+TEST(Search, FirstMatchAnywhereLastMatchNotTouchingTheEnd)
 {
     char text[] = "The QUICK fox, the quick dog";
-    EXPECT_EQ(text + 4, _strstri(text, "quick"));
     EXPECT_EQ(text, _strstri(text, "tHE"));
     EXPECT_EQ(text + 25, _strstri(text, "DOG"));
-    EXPECT_EQ(nullptr, _strstri(text, "cat"));
     EXPECT_EQ(nullptr, _strstri(text, "dogs"));
-    EXPECT_EQ(nullptr, _strstri(text, ""));
-    EXPECT_EQ(nullptr, _strstri(nullptr, "x"));
-    EXPECT_EQ(nullptr, _strstri(text, nullptr));
-}
 
-TEST(SearchLast, IgnoresMatchesThatTouchTheEnd)
-{
     char dotted[] = "a.b.c";
     EXPECT_EQ(dotted + 1, _strrstri(dotted, ".B"));
-    EXPECT_EQ(nullptr, _strrstri(dotted, ".c"));
     EXPECT_EQ(dotted + 3, _strrstri(dotted, "."));
+    EXPECT_EQ(nullptr, _strrstri(dotted, ".c"));
+    EXPECT_EQ(nullptr, _strrstri(dotted, "a.b.c"));
+    EXPECT_EQ(nullptr, _strrstri(dotted, "longer than the text"));
 
-    char repeated[] = "xAbxabx";
-    EXPECT_EQ(repeated + 4, _strrstri(repeated, "AB"));
-
-    char same[] = "name";
-    EXPECT_EQ(nullptr, _strrstri(same, "NAME"));
-    EXPECT_EQ(nullptr, _strrstri(same, "longer than name"));
-    EXPECT_EQ(nullptr, _strrstri(same, ""));
-    EXPECT_EQ(nullptr, _strrstri(nullptr, "n"));
-    EXPECT_EQ(nullptr, _strrstri(same, nullptr));
+    for (auto search : {_strstri, _strrstri}) {
+        EXPECT_EQ(nullptr, search(text, ""));
+        EXPECT_EQ(nullptr, search(nullptr, "x"));
+        EXPECT_EQ(nullptr, search(text, nullptr));
+    }
 }
 
 TEST(SafeCopy, TruncatesAndLeavesTheTailAlone)
 {
-    {
-        char dest[8] = "#######";
-        rv_safe_strcpy(dest, "sixchr", 4);
-        EXPECT_EQ(0, std::memcmp(dest, "six\0###", 8));
-    }
-    {
-        char dest[8] = "#######";
-        void* end = rv_safe_strcpy(dest, "x", 4);
-        EXPECT_EQ(0, std::memcmp(dest, "x\0#\0###", 8));
-        EXPECT_EQ(dest + 2, end);
-    }
-    {
-        char dest[4] = "###";
-        EXPECT_EQ(nullptr, rv_safe_strcpy(dest, "abc", 0));
-        EXPECT_STREQ("", dest);
-    }
-    {
-        char dest[4] = "###";
-        rv_safe_strcpy(dest, nullptr, 4);
-        EXPECT_EQ(0, std::memcmp(dest, "\0##", 4));
-    }
+    char dest[8] = "#######";
+    rv_safe_strcpy(dest, "sixchr", 4);
+    EXPECT_EQ(0, std::memcmp(dest, "six\0###", 8));
+    EXPECT_EQ(nullptr, rv_safe_strcpy(dest, "abc", 0));
+    EXPECT_EQ(0, std::memcmp(dest, "\0ix\0###", 8));
+    EXPECT_EQ(dest + 2, rv_safe_strcpy(dest, "x", 4));
+    EXPECT_EQ(0, std::memcmp(dest, "x\0x\0###", 8));
+    rv_safe_strcpy(dest, nullptr, 4);
+    EXPECT_EQ(0, std::memcmp(dest, "\0\0x\0###", 8));
     EXPECT_EQ(nullptr, rv_safe_strcpy(nullptr, "abc", 4));
 }

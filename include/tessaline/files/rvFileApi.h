@@ -22,9 +22,11 @@
  *   CloseHandle(h);
  * @endcode
  *
- * Port note: on x86-64 the file offset is 64 bits wide, so SetFilePointer64
- * hands the whole offset to lseek (on 32-bit x86 only its lower half went
- * through), and sizes are not limited to 32 bits.
+ * Port note: the file offset is 64 bits wide, so SetFilePointer64 hands the
+ * whole offset to lseek, and sizes are not limited to 32 bits. This holds on
+ * 32-bit x86 too, where the library is built with 64-bit file offsets: the
+ * classic 32-bit calls passed only the lower half of the offset and failed
+ * (EOVERFLOW, size -1) on files of 2 GiB and more.
  */
 #ifndef TESSALINE_FILES_RVFILEAPI_H
 #define TESSALINE_FILES_RVFILEAPI_H
