@@ -5,6 +5,7 @@
 #include <string>
 
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "config/sys.h"
@@ -46,6 +47,42 @@ FILE* sys::OpenStream(const char* name, const char* mode)
         return nullptr;
     }
     return std::fopen(name, mode);
+}
+
+FILE* sys::CreateStream(const char* name, unsigned int mode)
+{
+    if (injectedFault(SysCall::Open, name)) {
+        return nullptr;
+    }
+    if (unlink(name) != 0 && errno != ENOENT) {
+        return nullptr;
+    }
+    const int fd = open(name, O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, static_cast<mode_t>(mode));
+    if (fd < 0) {
+        return nullptr;
+    }
+    FILE* stream = fdopen(fd, "w+");
+    if (stream == nullptr) {
+        const int error = errno;
+        close(fd);
+        errno = error;
+    }
+    return stream;
+}
+
+bool sys::PermissionBits(const char* path, unsigned int* bits)
+{
+    struct stat status;
+    if (stat(path, &status) != 0) {
+        return false;
+    }
+    *bits = status.st_mode & 07777;
+    return true;
+}
+
+bool sys::SetPermissionBits(FILE* stream, unsigned int bits)
+{
+    return fchmod(fileno(stream), static_cast<mode_t>(bits)) == 0;
 }
 
 bool sys::Exists(const char* path)
@@ -103,6 +140,22 @@ int sys::Rename(const char* from, const char* to)
         return -1;
     }
     return std::rename(from, to);
+}
+
+int sys::Replace(const char* from, const char* to)
+{
+    if (injectedFault(SysCall::Replace, from)) {
+        return -1;
+    }
+    return std::rename(from, to);
+}
+
+int sys::Link(const char* from, const char* to)
+{
+    if (injectedFault(SysCall::Link, from)) {
+        return -1;
+    }
+    return link(from, to);
 }
 
 int sys::Unlink(const char* path)

@@ -6,7 +6,9 @@
 
 namespace tessaline::config::testing {
 
-enum class SysCall { Open, Exists, Writable, Write, Sync, Close, Rename, Unlink };
+// Open is every open, the temporary file's included; Replace is the rename
+// over an existing configuration file, Rename every other rename.
+enum class SysCall { Open, Exists, Writable, Write, Sync, Close, Rename, Replace, Link, Unlink };
 
 // Asked before each call; `path` is the file the call concerns (for
 // Rename, its source). A nonzero result is the errno with which the call

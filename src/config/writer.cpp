@@ -20,6 +20,8 @@ namespace {
 
 constexpr int kCreateAttempts = 3;
 constexpr std::size_t kTimeBufferSize = 128;
+constexpr unsigned int kFreshFileMode = 0666;
+constexpr unsigned int kOwnerOnly = 0600;
 
 void pauseOneSecond()
 {
@@ -44,11 +46,20 @@ public:
     TempFile(const TempFile&) = delete;
     TempFile& operator=(const TempFile&) = delete;
 
-    bool Create()
+    // Creates the file afresh, never through a link planted at its name.
+    // It takes the permission bits of the file it will replace, so that a
+    // file kept from other users stays so; it is created owner-only until
+    // they are set. Without a file to replace it gets those of a new fopen.
+    bool Create(const char* configName)
     {
+        unsigned int bits = 0;
+        const bool replacing = sys::PermissionBits(configName, &bits);
         for (int attempt = 1; attempt <= kCreateAttempts; ++attempt) {
-            m_file = sys::OpenStream(m_name.c_str(), "w+e");
+            m_file = sys::CreateStream(m_name.c_str(), replacing ? kOwnerOnly : kFreshFileMode);
             if (m_file != nullptr) {
+                if (replacing) {
+                    sys::SetPermissionBits(m_file, bits);
+                }
                 return true;
             }
             pauseOneSecond();
@@ -229,14 +240,35 @@ void reportUnlinkFailure(const char* name)
     std::fprintf(stderr, "rvConfig: unlink(%s) failed: %s (%d).", name, std::strerror(error), error);
 }
 
+// Replaces an existing file so that its name never stands empty: the old
+// file gets its backup name as a second link, and the temporary file is
+// renamed over it. False, with nothing changed but an earlier backup gone,
+// where a step is refused (a file system without hard links, say).
+bool replaceInOneStep(const char* configName, const char* tempName, const std::string& backupName)
+{
+    if (rvConfig::m_bBackups == 0) {
+        return sys::Replace(tempName, configName) == 0;
+    }
+    sys::Unlink(backupName.c_str());
+    if (sys::Link(configName, backupName.c_str()) != 0) {
+        return false;
+    }
+    if (sys::Replace(tempName, configName) != 0) {
+        sys::Unlink(backupName.c_str());
+        return false;
+    }
+    return true;
+}
+
 // Moves the old file aside (or removes it) and renames the temporary file
-// into its place. 1 when the file was replaced as asked.
-unsigned int replaceFile(const char* configName, const char* tempName)
+// into its place, step by step, with a message for each failure. 1 when
+// the file was replaced as asked.
+unsigned int replaceInSteps(const char* configName, const char* tempName, const std::string& backupName,
+                            bool oldFileExists)
 {
     unsigned int result = 1;
-    if (sys::Exists(configName)) {
+    if (oldFileExists) {
         if (rvConfig::m_bBackups != 0) {
-            const std::string backupName = tessaline::config::SideFileName(configName, "bak");
             sys::Unlink(backupName.c_str());
             if (sys::Rename(configName, backupName.c_str()) != 0) {
                 std::fprintf(stderr, "Error creating backup config file %s: %s\n", configName, std::strerror(errno));
@@ -257,6 +289,19 @@ unsigned int replaceFile(const char* configName, const char* tempName)
         }
         return 0;
     }
+    return result;
+}
+
+// The one-step replacement where the file system allows it; else the
+// steps, which then give every message and result as if they had been
+// the only way.
+unsigned int replaceFile(const char* configName, const char* tempName)
+{
+    const std::string backupName = tessaline::config::SideFileName(configName, "bak");
+    const bool oldFileExists = sys::Exists(configName);
+    const unsigned int result = oldFileExists && replaceInOneStep(configName, tempName, backupName)
+                                    ? 1
+                                    : replaceInSteps(configName, tempName, backupName, oldFileExists);
     sys::SyncDirectory(configName);
     return result;
 }
@@ -267,7 +312,7 @@ unsigned int tessaline::config::WritePass(rvConfig& config)
 {
     rvConfig::cfgStr running(config.m_strDefaultSection);
     TempFile out(SideFileName(config.m_szConfigName, "new"));
-    if (!out.Create()) {
+    if (!out.Create(config.m_szConfigName)) {
         return 0;
     }
     if (config.m_pFile != nullptr) {
@@ -285,8 +330,13 @@ unsigned int tessaline::config::WritePass(rvConfig& config)
     return replaceFile(config.m_szConfigName, out.Name());
 }
 
+// The class lock covers the whole of Flush, not the writing pass alone:
+// two threads that flush one shared object would otherwise race on its
+// stream, and a store made between the pass and the clearing of the
+// modified flag would be marked as saved without being on disk.
 unsigned int rvConfig::Flush(unsigned int bClear)
 {
+    ScopedClassLock lock;
     if (IsModified() != 0) {
         if (m_mode == OpenRead || m_szConfigName[0] == '\0') {
             return 0;
@@ -298,7 +348,6 @@ unsigned int rvConfig::Flush(unsigned int bClear)
         }
         unsigned int written;
         {
-            ScopedClassLock lock;
             TableRestorer restorer(m_sections);
             written = Serialize(1);
         }

@@ -2,14 +2,13 @@
 // failure leaves on disk and in memory.
 #include <cerrno>
 #include <functional>
-#include <regex>
 #include <string>
 
 #include <gtest/gtest.h>
 
 #include "config/sys_seam.h"
 #include "config/temp_dir.h"
-#include "support/capture_stderr.h"
+#include "config/written_text.h"
 #include "tessaline/config/rvConfig.h"
 
 namespace {
@@ -17,19 +16,8 @@ namespace {
 using tessaline::config::testing::SetFaultHook;
 using tessaline::config::testing::SysCall;
 using tessaline::test::TempDir;
+using tessaline::test::body;
 using Change = std::function<void(rvConfig&)>;
-
-// The text without its identification line, which must be the only one
-// and the last line.
-std::string body(const std::string& text)
-{
-    static const std::regex idLine("# Edited by Tessaline: [A-Z][a-z]+ [0-9]{2}, [0-9]{4} - [0-9:]{8}\n$");
-    std::smatch match;
-    EXPECT_TRUE(std::regex_search(text, match, idLine)) << text;
-    const std::string rest = text.substr(0, text.size() - match.length());
-    EXPECT_EQ(rest.find("Edited by"), std::string::npos) << text;
-    return rest;
-}
 
 std::string rewrite(const std::string& content, const Change& change)
 {
@@ -40,26 +28,6 @@ std::string rewrite(const std::string& content, const Change& change)
     EXPECT_EQ(config.Flush(0), 1u);
     EXPECT_FALSE(dir.Exists("app.new"));
     return body(dir.Read("app.ini"));
-}
-
-struct Outcome {
-    unsigned int result;
-    std::string messages;
-};
-
-// Flushes a changed "k = 1" file of `dir` with the seam failing as `hook` says.
-Outcome flushWithFaults(const TempDir& dir, tessaline::config::testing::FaultHook hook, unsigned int backups)
-{
-    rvConfig config(dir.Write("app.ini", "k = 1\n").c_str(), rvConfig::OpenUpdate);
-    config.PutValue("k", "2", "");
-    rvConfig::m_bBackups = backups;
-    tessaline::test::CaptureStderr capture;
-    SetFaultHook(hook);
-    const unsigned int result = config.Flush(1);
-    SetFaultHook(nullptr);
-    rvConfig::m_bBackups = 0;
-    EXPECT_EQ(config.IsModified(), result == 0 ? 1u : 0u);
-    return Outcome{result, capture.Text()};
 }
 
 TEST(RvConfigWriter, WorkedCaseLineForLine)
@@ -247,73 +215,6 @@ TEST(RvConfigWriter, RefusalsLeaveEverything)
     EXPECT_EQ(config.IsModified(), 1u);
     EXPECT_EQ(config.Close(1), 1u);
     EXPECT_EQ(body(dir.Read("app.ini")), "k = 2\n");
-}
-
-TEST(RvConfigWriter, FailedWritesKeepTheOldFile)
-{
-    const tessaline::config::testing::FaultHook hooks[] = {
-        [](SysCall call, const char*) { return call == SysCall::Write ? ENOSPC : 0; },
-        [](SysCall call, const char*) { return call == SysCall::Sync ? EIO : 0; },
-        [](SysCall call, const char*) { return call == SysCall::Close ? EIO : 0; },
-    };
-    for (const auto hook : hooks) {
-        TempDir dir;
-        const Outcome outcome = flushWithFaults(dir, hook, 0);
-        EXPECT_EQ(outcome.result, 0u);
-        EXPECT_EQ(outcome.messages, "");
-        EXPECT_EQ(dir.Read("app.ini"), "k = 1\n");
-        EXPECT_FALSE(dir.Exists("app.new"));
-    }
-}
-
-TEST(RvConfigWriter, ReplacementFailures)
-{
-    {
-        TempDir dir;
-        const auto backupRenameFails = [](SysCall call, const char* from) {
-            return call == SysCall::Rename && std::string(from).find(".ini") != std::string::npos ? EXDEV : 0;
-        };
-        const Outcome outcome = flushWithFaults(dir, backupRenameFails, 1);
-        EXPECT_EQ(outcome.result, 0u);
-        EXPECT_EQ(outcome.messages,
-                  "Error creating backup config file " + dir.Path("app.ini") + ": Invalid cross-device link\n");
-        EXPECT_EQ(body(dir.Read("app.ini")), "k = 2\n");
-    }
-    {
-        TempDir dir;
-        const Outcome outcome =
-            flushWithFaults(dir, [](SysCall call, const char*) { return call == SysCall::Unlink ? EPERM : 0; }, 0);
-        EXPECT_EQ(outcome.result, 1u);
-        EXPECT_EQ(outcome.messages, "rvConfig: unlink(" + dir.Path("app.ini") + ") failed: Operation not permitted (1).");
-        EXPECT_EQ(body(dir.Read("app.ini")), "k = 2\n");
-    }
-    {
-        // Without backups the temporary file is the only copy: it stays.
-        TempDir dir;
-        const Outcome outcome =
-            flushWithFaults(dir, [](SysCall call, const char*) { return call == SysCall::Rename ? EIO : 0; }, 0);
-        EXPECT_EQ(outcome.result, 0u);
-        EXPECT_EQ(outcome.messages, "rvConfig: rename(" + dir.Path("app.new") + ", " + dir.Path("app.ini") +
-                                        ") failed: Input/output error (5).");
-        EXPECT_FALSE(dir.Exists("app.ini"));
-        EXPECT_EQ(body(dir.Read("app.new")), "k = 2\n");
-    }
-    {
-        // With backups the old text is the backup; the temporary file goes,
-        // and its failed removal is reported too.
-        TempDir dir;
-        const auto tempCannotMove = [](SysCall call, const char* name) {
-            const bool temp = std::string(name).find(".new") != std::string::npos;
-            return temp && (call == SysCall::Rename || call == SysCall::Unlink) ? EIO : 0;
-        };
-        const Outcome outcome = flushWithFaults(dir, tempCannotMove, 1);
-        const std::string temp = dir.Path("app.new");
-        EXPECT_EQ(outcome.result, 0u);
-        EXPECT_EQ(outcome.messages, "rvConfig: rename(" + temp + ", " + dir.Path("app.ini") +
-                                        ") failed: Input/output error (5).rvConfig: unlink(" + temp +
-                                        ") failed: Input/output error (5).");
-        EXPECT_EQ(dir.Read("app.bak"), "k = 1\n");
-    }
 }
 
 }  // namespace

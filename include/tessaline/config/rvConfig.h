@@ -22,8 +22,8 @@
  * operation says how long it stays valid.
  *
  * Thread safety: one recursive lock, m_mutex, serves all objects together.
- * Single lookups and stores, Clear, the removals, Load and the writing part
- * of Flush hold it. Section, the enumerations and the counts do not, and the
+ * Single lookups and stores, Clear, the removals, Load and the whole of
+ * Flush hold it. Section, the enumerations and the counts do not, and the
  * string GetValue stores its result after the lock has gone: a caller that
  * shares one object between threads brackets such sequences with Lock() and
  * Unlock(), inside which the locked operations may still be called.
@@ -261,20 +261,36 @@ public:
     /// new keys end their section and new sections come last, in table
     /// order; one identification line closes the file. The merged text goes
     /// to a temporary file beside the old one ("app.new" for "app.ini"),
-    /// which then replaces it by rename. With CreateBackups(1) the old file
-    /// becomes "app.bak", else it is unlinked first. Refuses (0, nothing
-    /// touched) in OpenRead mode, without a ConfigName(), or when the file
-    /// exists but is not writable or cannot be opened.
+    /// which then replaces it. Refuses (0, nothing touched) in OpenRead
+    /// mode, without a ConfigName(), or when the file exists but is not
+    /// writable or cannot be opened.
     ///
-    /// No data is lost:
+    /// Guarantees (no data is lost):
+    /// - A crash or a kill at any moment leaves a complete file under the
+    ///   configuration's name, the old one or the new one. The temporary
+    ///   file is renamed over the old file in one step; with CreateBackups(1)
+    ///   the old file first gets its backup name ("app.bak") as a second hard
+    ///   link, so the backup holds the file as it was before this write.
+    /// - Where the file system refuses that (no hard links, or no rename over
+    ///   an existing file), the old file is renamed to the backup name (or
+    ///   unlinked without backups) and the temporary file renamed after it.
+    ///   A crash between the two leaves no file under the name: the new text
+    ///   is complete in "app.new", and with backups the old in "app.bak".
     /// - Every write to the temporary file is checked, and the file is
     ///   flushed and fsync'ed before anything is renamed. If any of that
-    ///   fails (a full disk), the temporary file is removed, the old file is
-    ///   left byte for byte, and the result is 0 without a message.
-    /// - The directory is synced after the temporary file is complete and
-    ///   after the final rename (best effort: not every file system can).
-    ///   A crash between the removal of the old name and the final rename
-    ///   leaves the new text complete in the temporary file.
+    ///   fails (a full disk, a file size limit), the temporary file is
+    ///   removed, the old file is left byte for byte, and the result is 0
+    ///   without a message. The directory is synced after the temporary file
+    ///   is complete and after the replacement (best effort: not every file
+    ///   system can).
+    /// - The temporary file is created afresh: a file or symbolic link
+    ///   already at its name is removed, never written through, and one
+    ///   planted meanwhile makes the attempt fail (three attempts, one second
+    ///   apart, then 0 without a message).
+    /// - The new file keeps the permission bits of the file it replaces (a
+    ///   0600 file stays 0600); a file that did not exist gets those of a new
+    ///   fopen, 0666 less the umask. The owner is not carried over: the file
+    ///   belongs to whoever rewrote it.
     /// - Side-file names never equal the file's own name: where replacing
     ///   the extension would give that name ("app.new", "app.bak"), the
     ///   extension is appended ("app.new.new", "app.bak.bak").
@@ -282,12 +298,14 @@ public:
     ///   gone and the temporary file holds the only copy on disk: it is kept
     ///   under its name. With backups on, the old text is in the backup and
     ///   the temporary file is removed.
-    /// The three failures of the replacement print one line each on stderr
-    /// (a failed backup rename, a failed unlink, a failed final rename), with
-    /// strerror(errno) and errno.
+    /// The step-by-step replacement prints one line on stderr for each of its
+    /// failures (a failed backup rename, a failed unlink, a failed final
+    /// rename), with strerror(errno) and errno; the one-step replacement
+    /// prints nothing, and its failure leads to the steps.
     ///
-    /// Holds the class lock while it writes. Ends any enumeration; the
-    /// current section is left at the last section the pass selected.
+    /// Holds the class lock for its whole length, so threads may flush one
+    /// shared object. Ends any enumeration; the current section is left at
+    /// the last section the pass selected.
     virtual unsigned int Flush(unsigned int bClear);
 
     /// Empties the object: no sections (bucket counts stay), IsValid() and
