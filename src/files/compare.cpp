@@ -6,6 +6,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "files/handle.h"
 #include "files/sys.h"
 #include "tessaline/files/rvDirIterator.h"
 #include "tessaline/files/rvFilename.h"
@@ -53,6 +54,5 @@ int64_t rvGetFileSize(const char* path)
 int64_t rvGetFileSize64(void* handle)
 {
     struct stat info;
-    const int fd = static_cast<int>(reinterpret_cast<intptr_t>(handle));
-    return Sys().fstat(fd, &info) == 0 ? static_cast<int64_t>(info.st_size) : -1;
+    return Sys().fstat(tessaline::files::Descriptor(handle), &info) == 0 ? static_cast<int64_t>(info.st_size) : -1;
 }

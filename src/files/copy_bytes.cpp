@@ -2,8 +2,11 @@
 #include "files/copy_bytes.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <cstddef>
 
+#include "files/handle.h"
+#include "files/sys.h"
 #include "tessaline/files/rvCopy.h"
 #include "tessaline/files/rvFileApi.h"
 
@@ -11,8 +14,9 @@ namespace tessaline::files {
 namespace {
 
 constexpr size_t kCopyBufferSize = 0x4000;
-
-void* const kInvalidHandle = reinterpret_cast<void*>(static_cast<intptr_t>(-1));
+// Large enough that the kernel copy of a big file takes few calls, small
+// enough for every file system's limit on one call.
+constexpr int64_t kKernelCopyChunk = int64_t{1} << 30;
 
 // Writes all of `count` bytes, completing short writes.
 bool WriteAll(void* handle, const char* data, unsigned long count)
@@ -28,11 +32,35 @@ bool WriteAll(void* handle, const char* data, unsigned long count)
     return true;
 }
 
+// Lets the kernel move as much of `*left` as it will, from the current offset
+// of one file to that of the other, and takes it off `*left`. The kernel copy
+// never decides the outcome: where it stops (a file system that cannot do it,
+// a device, a source that ends early, a full disk), the byte loop carries on
+// from the same offsets and gives exactly the results and failures it always
+// gives, errno included.
+void CopyInKernel(void* from, void* to, int64_t* left)
+{
+    const int savedErrno = errno;
+    while (*left > 0) {
+        const auto chunk = static_cast<size_t>(std::min(*left, kKernelCopyChunk));
+        const ssize_t moved =
+            Sys().copy_file_range(Descriptor(from), nullptr, Descriptor(to), nullptr, chunk, 0);
+        if (moved < 0 && errno == EINTR) {
+            continue;
+        }
+        if (moved <= 0) {
+            break;
+        }
+        *left -= moved;
+    }
+    errno = savedErrno;
+}
+
 }  // namespace
 
 bool OwnedHandle::IsOpen() const
 {
-    return m_handle != kInvalidHandle;
+    return m_handle != InvalidHandle();
 }
 
 int OwnedHandle::Close()
@@ -41,7 +69,7 @@ int OwnedHandle::Close()
         return 1;
     }
     void* handle = m_handle;
-    m_handle = kInvalidHandle;
+    m_handle = InvalidHandle();
     return CloseHandle(handle);
 }
 
@@ -51,6 +79,7 @@ bool CopyBytes(void* from, void* to)
     if (left < 0) {
         return false;
     }
+    CopyInKernel(from, to, &left);
     char buffer[kCopyBufferSize];
     while (left != 0) {
         const unsigned long want =

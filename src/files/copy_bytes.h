@@ -24,8 +24,8 @@ private:
     void* m_handle;
 };
 
-// Copies the source's size in bytes, as it stood when the copy began, through
-// a 16 KiB buffer. A read that finds the end early (the source shrank), a
+// Copies the source's size in bytes, as it stood when the copy began: as far
+// as the kernel copies between the files, then through a 16 KiB buffer. A read that finds the end early (the source shrank), a
 // failed read or write, or a write that makes no progress fails; a source
 // that grew is cut to its first size.
 bool CopyBytes(void* from, void* to);

@@ -8,10 +8,13 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include "files/handle.h"
 #include "files/open_at.h"
 #include "files/sys.h"
 #include "tessaline/util/rvString.h"
 
+using tessaline::files::Descriptor;
+using tessaline::files::Handle;
 using tessaline::files::Sys;
 
 namespace {
@@ -22,16 +25,6 @@ constexpr int kLargeFileFlag = 0x8000;
 constexpr int kOpenAttempts = 3;
 constexpr unsigned long kLastErrorSelector = 0xFFFFFFFFul;
 constexpr uint64_t kLowHalf = 0xFFFFFFFFull;
-
-int Descriptor(void* handle)
-{
-    return static_cast<int>(reinterpret_cast<intptr_t>(handle));
-}
-
-void* Handle(int fd)
-{
-    return reinterpret_cast<void*>(static_cast<intptr_t>(fd));
-}
 
 // One attempt: `open` repeated at once while a signal interrupts it.
 template <typename Open>
@@ -82,7 +75,7 @@ void* OpenWithAttempts(Open open)
             errno = error;
         }
     }
-    return Handle(-1);
+    return tessaline::files::InvalidHandle();
 }
 
 }  // namespace

@@ -22,6 +22,9 @@ struct SysCalls {
     int (*close)(int fd);
     ssize_t (*read)(int fd, void* buffer, size_t count);
     ssize_t (*write)(int fd, const void* buffer, size_t count);
+    // Kernel-side copy between the current offsets of two descriptors.
+    ssize_t (*copy_file_range)(int from, loff_t* fromOffset, int to, loff_t* toOffset,
+                               size_t count, unsigned int flags);
     off_t (*lseek)(int fd, off_t offset, int whence);
     int (*fstat)(int fd, struct stat* info);
     int (*stat)(const char* path, struct stat* info);

@@ -9,6 +9,7 @@
 
 #include "files/file_fixtures.h"
 #include "files/sys.h"
+#include "files/sys_fakes.h"
 #include "support/temp_dir.h"
 #include "tessaline/files/rvCopy.h"
 
@@ -115,18 +116,37 @@ TEST(CopyFile, FailedCopyRemovesTheTargetAndKeepsTheSource)
     static int calls;
     static const auto realRead = Sys().read;
     static const auto realClose = Sys().close;
+    static const auto realKernelCopy = Sys().copy_file_range;
     const struct {
         const char* what;
         void (*breakIt)();
     } cases[] = {
         {"the source ends early",
          [] {
+             NoKernelCopy();
              Sys().read = [](int fd, void* buffer, size_t count) -> ssize_t {
                  return ++calls == 2 ? 0 : realRead(fd, buffer, count);
              };
          }},
+        {"the source ends early under the kernel copy",
+         [] {
+             Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t,
+                                        unsigned int) -> ssize_t {
+                 return ++calls == 1 ? realKernelCopy(from, nullptr, to, nullptr, 1000, 0) : 0;
+             };
+             Sys().read = [](int, void*, size_t) -> ssize_t { return 0; };
+         }},
         {"a write fails",
-         [] { Sys().write = [](int, const void*, size_t) -> ssize_t { return -1; }; }},
+         [] {
+             NoKernelCopy();
+             Sys().write = [](int, const void*, size_t) -> ssize_t { return -1; };
+         }},
+        {"the disk fills under the kernel copy",
+         [] {
+             Sys().copy_file_range = [](int, loff_t*, int, loff_t*, size_t,
+                                        unsigned int) -> ssize_t { return Fail(ENOSPC); };
+             Sys().write = [](int, const void*, size_t) -> ssize_t { return Fail(ENOSPC); };
+         }},
         {"the target fails to close",
          [] {
              Sys().close = [](int fd) {
@@ -145,6 +165,30 @@ TEST(CopyFile, FailedCopyRemovesTheTargetAndKeepsTheSource)
         EXPECT_FALSE(Exists(target));
         EXPECT_EQ(50000u, Slurp(source).size());
     }
+}
+
+TEST(CopyFile, TheLoopFinishesWhatTheKernelCopyLeaves)
+{
+    TempDir dir;
+    std::string content;
+    for (int i = 0; content.size() < 100000; ++i) {
+        content += std::to_string(i) + ",";
+    }
+    const std::string source = Put(dir / "source", content);
+    static int calls;
+    static const auto realKernelCopy = Sys().copy_file_range;
+    ScopedSysCalls restore;
+    calls = 0;
+    Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t,
+                               unsigned int) -> ssize_t {
+        return ++calls == 1 ? realKernelCopy(from, nullptr, to, nullptr, 12345, 0) : Fail(EXDEV);
+    };
+    EXPECT_EQ(1, Copy(source, dir / "target", 0, 1));
+    EXPECT_EQ(content, Slurp(dir / "target"));
+
+    NoKernelCopy();
+    EXPECT_EQ(1, Copy(source, dir / "again", 0, 1));
+    EXPECT_EQ(content, Slurp(dir / "again"));
 }
 
 TEST(CopyFile, LinksMovesAndRefusedSchemes)

@@ -17,6 +17,7 @@
 
 #include "files/file_fixtures.h"
 #include "files/sys.h"
+#include "files/sys_fakes.h"
 #include "support/temp_dir.h"
 #include "tessaline/files/rvCopy.h"
 #include "tessaline/files/rvFileApi.h"
@@ -53,11 +54,6 @@ bool IsTarget(const char* path)
     return length >= 6 && std::strcmp(path + length - 6, "target") == 0;
 }
 
-int Fail(int error)
-{
-    errno = error;
-    return -1;
-}
 
 int CopyOver(const Paths& paths, unsigned overwrite, unsigned move = 0)
 {
@@ -224,10 +220,14 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
          [] { Sys().fstat = [](int, struct stat*) { return Fail(EIO); }; },
          [](const Paths& p) { return CopyOver(p, 1); }, 0, kMissing},
         {"read fails (EIO)", false,
-         [] { Sys().read = [](int, void*, size_t) -> ssize_t { return Fail(EIO); }; },
+         [] {
+             NoKernelCopy();
+             Sys().read = [](int, void*, size_t) -> ssize_t { return Fail(EIO); };
+         },
          [](const Paths& p) { return CopyOver(p, 1); }, 0, kMissing},
         {"disk fills after the first block", false,
          [] {
+             NoKernelCopy();
              Sys().write = [](int fd, const void* data, size_t count) -> ssize_t {
                  struct stat info;
                  fstat(fd, &info);
@@ -255,6 +255,7 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
          0, kSource.substr(0, 20000)},
         {"the failed copy cannot be removed", false,
          [] {
+             NoKernelCopy();
              Sys().write = [](int, const void*, size_t) -> ssize_t { return Fail(ENOSPC); };
              Sys().unlinkat = [](int, const char*, int) { return Fail(EBUSY); };
          },
