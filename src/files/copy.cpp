@@ -67,16 +67,18 @@ int ExistsAt(const Place& place)
     return Sys().faccessat(place.directory, place.name, F_OK, 0) == 0;
 }
 
-bool SameFile(const Place& first, const Place& second)
+bool IsSameFile(const struct stat& first, const struct stat& second)
 {
-    struct stat a;
-    struct stat b;
-    return StatAt(first, &a) == 0 && StatAt(second, &b) == 0 && a.st_dev == b.st_dev &&
-           a.st_ino == b.st_ino;
+    return first.st_dev == second.st_dev && first.st_ino == second.st_ino;
 }
 
+// Only a text with "://" has a scheme; the split is skipped for the others,
+// as it asks the file system about the text.
 bool IsRefusedScheme(const char* text)
 {
+    if (std::strstr(text, "://") == nullptr) {
+        return false;
+    }
     rvFilename name(text, 0);
     const int scheme = HashToken(name.Scheme(), tessaline::g_schemeTokens,
                                  tessaline::kSchemeTokenLast, 0, 1);
@@ -168,10 +170,16 @@ int CopyMatches(const End& source, const char* wildcardText, const End& target,
 // The single way: one file onto the file `target`.
 int CopyOne(const End& source, const End& target, const CopyOptions& options)
 {
-    if (!ExistsAt(source.place)) {
+    // One stat of the source serves every question asked of it below. It
+    // stands for `access` as well: for mere existence both fail alike.
+    struct stat sourceInfo;
+    if (StatAt(source.place, &sourceInfo) != 0) {
         return 0;
     }
-    if (tessaline::files::IsDirectoryAt(source.place) == 1) {
+    const int isDirectory = source.place.IsHost()
+                                ? tessaline::files::IsDirectoryAt(source.place)
+                                : ((sourceInfo.st_mode & S_IFDIR) != 0 ? 1 : 0);
+    if (isDirectory == 1) {
         // Below the host's path the text is not split again: the split asks
         // the file system, which may answer differently by now.
         rvFilename all(source.place.text, 0);
@@ -184,15 +192,14 @@ int CopyOne(const End& source, const End& target, const CopyOptions& options)
         CreateDir(rvFilename(target.place.text, 0).Directory(), 0) == 0) {
         return 0;
     }
-    if (overwrite != 1 && ExistsAt(target.place)) {
-        struct stat from;
-        struct stat to;
-        if (StatAt(source.place, &from) == 0 && StatAt(target.place, &to) == 0) {
-            if (from.st_mtime == to.st_mtime && from.st_size == to.st_size) {
-                return 0;
-            }
-            overwrite = 1;
+    struct stat targetInfo;
+    const bool targetExists = StatAt(target.place, &targetInfo) == 0;
+    if (overwrite != 1 && targetExists) {
+        if (sourceInfo.st_mtime == targetInfo.st_mtime &&
+            sourceInfo.st_size == targetInfo.st_size) {
+            return 0;
         }
+        overwrite = 1;
     }
     if (IsRefusedScheme(source.place.text)) {
         return 0;
@@ -202,7 +209,7 @@ int CopyOne(const End& source, const End& target, const CopyOptions& options)
                    ? 1
                    : 0;
     }
-    if (SameFile(source.place, target.place)) {
+    if (targetExists && IsSameFile(sourceInfo, targetInfo)) {
         return 0;
     }
 
