@@ -176,10 +176,7 @@ int CopyOne(const End& source, const End& target, const CopyOptions& options)
     if (StatAt(source.place, &sourceInfo) != 0) {
         return 0;
     }
-    const int isDirectory = source.place.IsHost()
-                                ? tessaline::files::IsDirectoryAt(source.place)
-                                : ((sourceInfo.st_mode & S_IFDIR) != 0 ? 1 : 0);
-    if (isDirectory == 1) {
+    if (tessaline::files::IsDirectoryAt(source.place, sourceInfo) == 1) {
         // Below the host's path the text is not split again: the split asks
         // the file system, which may answer differently by now.
         rvFilename all(source.place.text, 0);

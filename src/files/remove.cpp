@@ -11,6 +11,7 @@
 #include <cstring>
 #include <string>
 
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "files/sys.h"
@@ -105,10 +106,13 @@ int RemoveAt(const Place& place, unsigned int recurse)
     if (IsWildcard(place.text)) {
         return RemoveMatches(place, recurse);
     }
-    if (Sys().faccessat(place.directory, place.name, F_OK, 0) != 0) {
+    // One stat stands for `access` and the directory test: for mere
+    // existence both fail alike.
+    struct stat info;
+    if (Sys().fstatat(place.directory, place.name, &info, 0) != 0) {
         return 0;
     }
-    if (tessaline::files::IsDirectoryAt(place) == 1 && recurse == 1) {
+    if (tessaline::files::IsDirectoryAt(place, info) == 1 && recurse == 1) {
         return RemoveTree(place);
     }
     return RemoveFile(place);

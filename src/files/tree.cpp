@@ -64,9 +64,16 @@ int IsDirectoryAt(const Place& place)
         return rvFilename::IsDirectory(place.text);
     }
     struct stat info;
-    return Sys().fstatat(place.directory, place.name, &info, 0) == 0 && (info.st_mode & S_IFDIR)
-               ? 1
-               : 0;
+    return Sys().fstatat(place.directory, place.name, &info, 0) == 0 ? IsDirectoryAt(place, info)
+                                                                      : 0;
+}
+
+int IsDirectoryAt(const Place& place, const struct stat& info)
+{
+    if (place.IsHost()) {
+        return rvFilename::IsDirectory(place.text);
+    }
+    return (info.st_mode & S_IFDIR) != 0 ? 1 : 0;
 }
 
 bool IsLinkAt(const Place& place)

@@ -11,6 +11,7 @@
 #define TESSALINE_SRC_FILES_TREE_H
 
 #include <fcntl.h>
+#include <sys/stat.h>
 
 #include <functional>
 #include <string>
@@ -58,6 +59,11 @@ DirectoryFd OpenDirectory(const Place& place, Links links);
 // 1 when the place is a directory (links followed, the single-bit test of
 // rvFilename::IsDirectory), else 0.
 int IsDirectoryAt(const Place& place);
+
+// The same answer from a stat of the place (links followed) that the caller
+// already holds; only a host's text, with its forgiven trailing
+// separators, is asked again.
+int IsDirectoryAt(const Place& place, const struct stat& info);
 
 // 1 when the place is a symbolic link.
 bool IsLinkAt(const Place& place);
