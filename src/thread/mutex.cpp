@@ -41,36 +41,60 @@ int finish(int result, int* err)
     return result == 0 ? 0 : CHECK_SYSERROR(result);
 }
 
+// The record's fields are read and written atomically: the holder changes
+// them without m_guard (below), while other threads look at them under it.
 void setRecord(MMutex& mutex, unsigned long owner, int count, int held)
 {
-    mutex.m_owner = owner;
-    mutex.m_count = count;
-    mutex.m_held = held;
+    tessaline::storeRelaxed(mutex.m_owner, owner);
+    tessaline::storeRelaxed(mutex.m_count, count);
+    tessaline::storeRelaxed(mutex.m_held, held);
     tessaline::storeRelaxed(mutex.m_locked, held);
 }
 
-// Lock and Try of the checked and recursive types. A free mutex is taken
-// with trylock inside the same guard section that reads the record, so the
-// uncontended case costs one guard round instead of two; trylock never
-// blocks, so holding m_guard across it keeps the lock order. Only when the
-// platform mutex is taken does the caller leave the guard and block on it.
-// The record still changes only after the platform mutex is held.
-int lockTracked(MMutex& mutex, int* err, bool blocking)
+// Only the holder ever finds its own identifier in m_owner: it writes it
+// after taking m_mutex and clears it before letting go. So the holder's own
+// steps (re-entry, release) are decided without m_guard, and no other thread
+// can see a record that the guard would have shown it differently.
+bool isHolder(const MMutex& mutex, unsigned long self)
+{
+    return loadRelaxed(mutex.m_owner) == self;
+}
+
+// Lock and Try of the recursive type: the holder re-enters and counts;
+// anyone else goes to m_mutex, where the record is free by the time it
+// succeeds.
+int lockRecursive(MMutex& mutex, int* err, bool blocking)
+{
+    const unsigned long self = pthread_self();
+    if (isHolder(mutex, self)) {
+        tessaline::storeRelaxed(mutex.m_count, loadRelaxed(mutex.m_count) + 1);
+        return 0;
+    }
+    const int result =
+        blocking ? pthread_mutex_lock(&mutex.m_mutex) : pthread_mutex_trylock(&mutex.m_mutex);
+    if (result == 0) {
+        setRecord(mutex, self, 1, 1);
+    }
+    record(mutex, result);
+    return finish(result, err);
+}
+
+// Lock and Try of the checked type. A free mutex is taken with trylock
+// inside the same guard section that reads the record, so the uncontended
+// case costs one guard round instead of two; trylock never blocks, so
+// holding m_guard across it keeps the lock order. Only when the platform
+// mutex is taken does the caller leave the guard and block on it. The record
+// still changes only after the platform mutex is held.
+int lockChecked(MMutex& mutex, int* err, bool blocking)
 {
     const unsigned long self = pthread_self();
     int result;
     {
         GuardLock guard(mutex.m_guard);
-        if (mutex.m_held == 1) {
-            if (mutex.m_type == MMutex_::MutexChecked) {
-                mutex.StoreLastError(kRefused);
-                storeErrno(err);
-                return 2;
-            }
-            if (mutex.m_owner == self) {
-                ++mutex.m_count;
-                return 0;
-            }
+        if (loadRelaxed(mutex.m_held) == 1) {
+            mutex.StoreLastError(kRefused);
+            storeErrno(err);
+            return 2;
         }
         result = pthread_mutex_trylock(&mutex.m_mutex);
         if (result == 0)
@@ -86,6 +110,12 @@ int lockTracked(MMutex& mutex, int* err, bool blocking)
     return finish(result, err);
 }
 
+int lockTracked(MMutex& mutex, int* err, bool blocking)
+{
+    return mutex.m_type == MMutex_::MutexRecursive ? lockRecursive(mutex, err, blocking)
+                                                    : lockChecked(mutex, err, blocking);
+}
+
 }  // namespace
 
 namespace tessaline {
@@ -93,7 +123,8 @@ namespace tessaline {
 MutexRecord readRecord(MMutex& mutex)
 {
     GuardLock guard(mutex.m_guard);
-    return MutexRecord{mutex.m_owner, mutex.m_count, mutex.m_held};
+    return MutexRecord{loadRelaxed(mutex.m_owner), loadRelaxed(mutex.m_count),
+                       loadRelaxed(mutex.m_held)};
 }
 
 void writeRecord(MMutex& mutex, const MutexRecord& record)
@@ -173,24 +204,24 @@ int MMutex::Unlock(int* err)
     if (!isTracked(*this)) {
         return finish(loadRelaxed(m_lastError), err);
     }
-    int result = record(*this, 0);
-    {
-        GuardLock guard(m_guard);
-        if (m_held == 0) {
-            StoreLastError(kRefused);
-            storeErrno(err);
-            return 3;
+    const unsigned long self = pthread_self();
+    if (isHolder(*this, self)) {
+        int result = 0;
+        const int count = loadRelaxed(m_count) - 1;
+        if (count > 0) {
+            tessaline::storeRelaxed(m_count, count);
+        } else {
+            setRecord(*this, 0, 0, 0);
+            result = pthread_mutex_unlock(&m_mutex);
         }
-        if (m_owner != static_cast<unsigned long>(pthread_self())) {
-            StoreLastError(kRefused);
-            return -2;
-        }
-        if (--m_count == 0) {
-            m_owner = 0;
-            m_held = 0;
-            tessaline::storeRelaxed(m_locked, 0);
-            result = record(*this, pthread_mutex_unlock(&m_mutex));
-        }
+        return finish(record(*this, result), err);
     }
-    return finish(result, err);
+    // The refusals. m_owner cannot turn into the caller meanwhile.
+    GuardLock guard(m_guard);
+    StoreLastError(kRefused);
+    if (loadRelaxed(m_held) == 0) {
+        storeErrno(err);
+        return 3;
+    }
+    return -2;
 }
