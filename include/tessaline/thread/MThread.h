@@ -104,8 +104,10 @@ public:
 /**
  * A mutex with plain, checked and recursive modes. The checked and
  * recursive ("tracked") modes keep a record of the holder (m_count, m_owner,
- * m_held) under the inner m_guard, which is held only for short spans and
- * never while blocking on m_mutex.
+ * m_held). Other threads read it under the inner m_guard, which is held
+ * only for short spans and never while blocking on m_mutex; the holder's
+ * re-entry and release change it without the guard (its fields are accessed
+ * atomically), since no other thread can take the holder's place meanwhile.
  *
  * `err`, where given, receives errno just before the call returns, except
  * on a recursive re-entry and on an Unlock by a non-holder.
@@ -158,7 +160,7 @@ public:
 
     pthread_mutexattr_t m_attr;  ///< The attribute object of m_mutex; it sets nothing.
     pthread_mutex_t m_mutex;     ///< The lock that callers contend for.
-    pthread_mutex_t m_guard;     ///< Guards m_count, m_owner and m_held; held briefly.
+    pthread_mutex_t m_guard;     ///< Guards other threads' looks at the record; held briefly.
     int m_count;                 ///< How often the holder has taken a tracked mutex.
     unsigned long m_owner;       ///< The holder's pthread_self(), 0 when free.
     int m_held;                  ///< 1 while the record names a holder.
