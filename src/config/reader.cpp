@@ -1,5 +1,6 @@
 // Opening a configuration file and the reading pass.
 #include <cerrno>
+#include <cstdint>
 #include <cstring>
 #include <ctime>
 
@@ -109,6 +110,31 @@ char* valueOfLine(rvConfig& config, char* rest)
     return value;
 }
 
+// The key names of one reading pass. Most files repeat their key names from
+// section to section, so the pass shares one text per spelling instead of
+// copying it for every line: the text is immutable and shared anyway. A
+// small direct-mapped cache bounds the cost for files whose names never
+// repeat; a name that is not in it is copied as before.
+class KeyNames {
+public:
+    const rvConfig::cfgStr& Get(const char* text)
+    {
+        uint32_t hash = 2166136261u;
+        for (const char* c = text; *c != '\0'; ++c) {
+            hash = (hash ^ static_cast<unsigned char>(*c)) * 16777619u;
+        }
+        rvConfig::cfgStr& slot = m_slots[hash % kSlots];
+        if (slot.empty() || std::strcmp(slot.c_str(), text) != 0) {
+            slot = rvConfig::cfgStr(text);
+        }
+        return slot;
+    }
+
+private:
+    static constexpr size_t kSlots = 256;
+    rvConfig::cfgStr m_slots[kSlots];
+};
+
 rvConfig::KeyTable& sectionKeys(rvConfig& config, const rvConfig::cfgStr& name)
 {
     rvConfig::SectionTable::iterator found = config.m_sections.find(name);
@@ -128,6 +154,7 @@ void readPass(rvConfig& config)
     // Only section lines and Section can change the section table between
     // key lines, so the running section is looked up once per block.
     rvConfig::KeyTable* keys = nullptr;
+    KeyNames keyNames;
     char line[tessaline::config::kLineBufferSize];
     while (config.m_pFile != nullptr && !std::feof(config.m_pFile)) {
         if (!ReadLine(config.m_pFile, line)) {
@@ -157,7 +184,7 @@ void readPass(rvConfig& config)
             keys = &sectionKeys(config, running);
         }
         const std::pair<rvConfig::KeyTable::iterator, bool> added =
-            keys->insert(rvConfig::KeyTable::value_type(rvConfig::cfgStr(key), rvConfig::cfgStr()));
+            keys->insert(rvConfig::KeyTable::value_type(keyNames.Get(key), rvConfig::cfgStr()));
         if (added.second) {
             added.first->second = rvConfig::cfgStr(value);
         }

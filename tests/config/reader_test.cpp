@@ -127,6 +127,36 @@ TEST(RvConfigReader, SectionsAndTheDefaultSection)
     EXPECT_EQ(config.m_pFile, nullptr);
 }
 
+TEST(RvConfigReader, KeyNamesKeepTheirSpellingInEverySection)
+{
+    // Names repeat across sections and differ in case and in number, more
+    // of them than the reader shares at once.
+    std::string text;
+    const char* spellings[] = {"port", "Port", "PORT"};
+    for (int section = 0; section < 30; ++section) {
+        text += "[s" + std::to_string(section) + "]\n" + spellings[section % 3] + " = p\n";
+        for (int key = 0; key < 40; ++key) {
+            text += "k" + std::to_string(section * 7 + key) + " = v\n";
+        }
+    }
+    TempDir dir;
+    rvConfig config(dir.Write("many.ini", text).c_str(), rvConfig::OpenRead);
+    for (int section = 0; section < 30; ++section) {
+        const std::string name = "s" + std::to_string(section);
+        std::string keys;
+        for (const char* key = config.EnumTokens(name.c_str(), 1); key != nullptr;
+             key = config.EnumTokens(name.c_str(), 0)) {
+            keys += std::string(key) + ",";
+        }
+        EXPECT_NE(keys.find(std::string(spellings[section % 3]) + ","), std::string::npos)
+            << name << ": " << keys;
+        for (int key = 0; key < 40; ++key) {
+            const std::string own = "k" + std::to_string(section * 7 + key) + ",";
+            EXPECT_NE(keys.find(own), std::string::npos) << name << " lacks " << own;
+        }
+    }
+}
+
 TEST(RvConfigReader, ReadReplacesContentAndStartsInTheDefaultSection)
 {
     TempDir dir;
