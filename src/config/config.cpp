@@ -6,6 +6,7 @@
 #include "config/borrowed_name.h"
 #include "config/class_lock.h"
 #include "config/lookup.h"
+#include "config/release.h"
 #include "tessaline/config/rvConfig.h"
 #include "util/load_time.h"
 
@@ -59,11 +60,13 @@ rvConfig::rvConfig(const char* path, OpenMode mode)
 rvConfig::~rvConfig()
 {
     Close(0);
+    tessaline::config::ReleaseKeys(m_sections);
 }
 
 void rvConfig::Clear()
 {
     ScopedClassLock lock;
+    tessaline::config::ReleaseKeys(m_sections);
     m_sections.clear();
     m_nItems = 0;
     m_bModified = 0;
