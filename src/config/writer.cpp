@@ -6,6 +6,7 @@
 #include <ctime>
 #include <string>
 
+#include "config/borrowed_name.h"
 #include "config/class_lock.h"
 #include "config/passes.h"
 #include "config/side_name.h"
@@ -163,7 +164,7 @@ void mergeKeyLine(rvConfig& config, TempFile& out, char* text, const rvConfig::c
     if (section == config.m_sections.end()) {
         return;
     }
-    section->second.erase(rvConfig::cfgStr(key));
+    section->second.erase(tessaline::config::BorrowedName(key));
     if (section->second.empty()) {
         config.RemoveSection(name.c_str());
     }
