@@ -14,6 +14,13 @@
 /// whose names hold "*" or "?" are themselves taken as patterns when a tree is
 /// copied or removed.
 ///
+/// Bytes move by `copy_file_range` as far as the kernel copies between the
+/// two files; wherever it stops (another file system, a device, a source
+/// that ends early, a full disk) the 16 KiB read/write loop carries on from
+/// the same offsets and decides the result, so counts, failures and errno
+/// are those of the loop. On file systems that share extents the target may
+/// share blocks with the source; its bytes are the same.
+///
 /// Thread safety: no locks and no shared state; calls on separate trees are
 /// independent. A tree that changes during a walk gives what the platform's
 /// directory reading delivers. Recursion depth follows the depth of the tree,
