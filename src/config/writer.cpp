@@ -75,12 +75,11 @@ public:
         m_good = m_good && sys::Write(m_file, text, length, m_name.c_str());
     }
 
+    // One write per key line, through a buffer that keeps its capacity.
     void PutKey(const char* key, const char* value)
     {
-        Put(key);
-        Put(" = ");
-        Put(value);
-        Put("\n");
+        m_line.assign(key).append(" = ").append(value).append("\n");
+        Put(m_line.data(), m_line.size());
     }
 
     // Flushes, syncs and closes; true when everything reached the disk.
@@ -98,6 +97,7 @@ private:
     std::string m_name;
     FILE* m_file;
     bool m_good;
+    std::string m_line;
 };
 
 // Restores the section table when the writing pass is over, however it
@@ -159,14 +159,16 @@ void mergeKeyLine(rvConfig& config, TempFile& out, char* text, const rvConfig::c
     }
     out.PutKey(key, value);
     // Erase from the section the lookup searched: "" is the current one.
-    const rvConfig::cfgStr name = running.empty() ? config.m_strSection : running;
+    const rvConfig::cfgStr& name = running.empty() ? config.m_strSection : running;
     const rvConfig::SectionTable::iterator section = config.m_sections.find(name);
     if (section == config.m_sections.end()) {
         return;
     }
     section->second.erase(tessaline::config::BorrowedName(key));
     if (section->second.empty()) {
-        config.RemoveSection(name.c_str());
+        // A copy: removing the current section may replace m_strSection.
+        const rvConfig::cfgStr emptied = name;
+        config.RemoveSection(emptied.c_str());
     }
 }
 
