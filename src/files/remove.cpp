@@ -14,6 +14,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "files/member_text.h"
 #include "files/sys.h"
 #include "files/tree.h"
 #include "tessaline/files/rvFilename.h"
@@ -43,11 +44,10 @@ void ForEachMember(int directory, const std::string& directoryText, const char* 
                    Remove remove)
 {
     tessaline::files::ForEachEntry(directory, pattern, [&](const char* entry) {
-        rvFilename item(entry, 0);
-        item.Directory(directoryText.c_str());
+        const std::string text = tessaline::files::MemberText(directoryText.c_str(), entry);
         std::string name;
-        if (tessaline::files::NameInside(directoryText.c_str(), item, &name)) {
-            remove(Place{directory, name.c_str(), item});
+        if (tessaline::files::NameInside(directoryText.c_str(), text.c_str(), &name)) {
+            remove(Place{directory, name.c_str(), text.c_str()});
         }
     });
 }

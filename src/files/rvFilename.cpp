@@ -3,6 +3,10 @@
 #include <string.h>
 #include <strings.h>
 
+#include <memory>
+#include <string>
+
+#include "files/member_text.h"
 #include "files/path_limits.h"
 #include "tessaline/util/rvString.h"
 
@@ -60,6 +64,38 @@ private:
     char* m_text;
     char* m_end;
 };
+
+// The text that Join forms from its parts, before it is split again; the
+// caller owns it.
+char* JoinParts(const char* scheme, const char* server, const char* directory, const char* file,
+                const char* ext)
+{
+    TextBuilder text(16 + LengthOf(scheme) + LengthOf(server) + LengthOf(directory) +
+                     LengthOf(file) + LengthOf(ext));
+    if (HasText(scheme)) {
+        text.Append(scheme);
+        if (!text.Holds("://"))
+            text.Append("://");
+    }
+    if (HasText(server)) {
+        if (!text.Holds("://"))
+            text.Append("//");
+        text.Append(server);
+    }
+    if (HasText(directory)) {
+        text.Append(directory);
+        char last = directory[strlen(directory) - 1];
+        if (last != '/' && last != '\\')
+            text.Append("/");
+    }
+    if (HasText(file))
+        text.Append(file);
+    if (HasText(ext)) {
+        text.Append(".");
+        text.Append(ext);
+    }
+    return text.Release();
+}
 
 // The first occurrence in `path` of the text that the given components join
 // to, running to the end of `path`; "" when there is none.
@@ -230,33 +266,9 @@ const char* rvFilename::Join(const char* scheme, const char* server, const char*
 
     // Every argument is read before the old text goes, so they may point
     // into this object.
-    TextBuilder text(16 + LengthOf(scheme) + LengthOf(server) + LengthOf(directory) +
-                     LengthOf(file) + LengthOf(ext));
-    if (HasText(scheme)) {
-        text.Append(scheme);
-        if (!text.Holds("://"))
-            text.Append("://");
-    }
-    if (HasText(server)) {
-        if (!text.Holds("://"))
-            text.Append("//");
-        text.Append(server);
-    }
-    if (HasText(directory)) {
-        text.Append(directory);
-        char last = directory[strlen(directory) - 1];
-        if (last != '/' && last != '\\')
-            text.Append("/");
-    }
-    if (HasText(file))
-        text.Append(file);
-    if (HasText(ext)) {
-        text.Append(".");
-        text.Append(ext);
-    }
-
+    char* joined = JoinParts(scheme, server, directory, file, ext);
     delete[] m_pPath;
-    m_pPath = text.Release();
+    m_pPath = joined;
     Split(nullptr);
     NormalizePath(m_pPath);
     return m_pPath;
@@ -348,3 +360,16 @@ int rvFilename::operator<(const rvFilename& other) const
         return 0;
     return _stricmp(m_pPath, other.m_pPath) > 0 ? 1 : 0;
 }
+
+namespace tessaline::files {
+
+std::string MemberText(const char* directory, const char* entry)
+{
+    rvFilename item(entry, 0);
+    const std::unique_ptr<char[]> joined(
+        JoinParts(item.Scheme(), item.Server(), directory, item.File(), item.Ext()));
+    rvFilename::NormalizePath(joined.get());
+    return joined.get();
+}
+
+}  // namespace tessaline::files
