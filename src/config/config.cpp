@@ -30,28 +30,12 @@ constexpr std::size_t kMaxConfigName = 4094;
 }  // namespace
 
 rvConfig::rvConfig()
-    : m_mode(OpenRead),
-      m_nItems(0),
-      m_bModified(0),
-      m_pFile(nullptr),
-      m_bTokenStart(1),
-      m_itToken(nullptr, nullptr),
-      m_szConfigName(),
-      m_strDefaultSection(m_szDefaults)
 {
     m_itSection = m_sections.end();
     Section(m_strDefaultSection.c_str(), 1);
 }
 
 rvConfig::rvConfig(const char* path, OpenMode mode)
-    : m_mode(OpenRead),
-      m_nItems(0),
-      m_bModified(0),
-      m_pFile(nullptr),
-      m_bTokenStart(1),
-      m_itToken(nullptr, nullptr),
-      m_szConfigName(),
-      m_strDefaultSection(m_szDefaults)
 {
     m_itSection = m_sections.end();
     Load(path, mode);

@@ -490,18 +490,18 @@ public:
 
     /// Mode of the last successful Open, or what Mode(mode) set; OpenRead at
     /// construction, so that nothing is written before a mode is chosen.
-    OpenMode m_mode;
+    OpenMode m_mode = OpenRead;
     /// Items stored since the last reset; what IsValid() returns.
-    unsigned int m_nItems;
+    unsigned int m_nItems = 0;
     /// 1 while there are changes that Flush has not saved.
-    unsigned int m_bModified;
+    unsigned int m_bModified = 0;
     /// The stream between Open and Close, else null. Owned by the object.
-    FILE* m_pFile;
+    FILE* m_pFile = nullptr;
     /// Keeps alive the text that the last hit of the string GetValue
     /// returned.
     cfgStr m_strValue;
     /// 1 when the next EnumTokens starts from the first key.
-    unsigned int m_bTokenStart;
+    unsigned int m_bTokenStart = 1;
     /// @name Enumeration cursors
     /// Cursors of the enumerations: at the end of m_sections, and on no
     /// table at all, at construction.
@@ -510,13 +510,13 @@ public:
     /// Cursor of EnumSections.
     SectionTable::iterator m_itSection;
     /// Cursor of EnumTokens.
-    KeyTable::iterator m_itToken;
+    KeyTable::iterator m_itToken{nullptr, nullptr};
     ///@}
     /// The configuration file's name, NUL-terminated, at most 4094
     /// characters.
-    char m_szConfigName[4096];
+    char m_szConfigName[4096] = {};
     /// Name of the default section.
-    cfgStr m_strDefaultSection;
+    cfgStr m_strDefaultSection{m_szDefaults};
     /// Name of the current section, in the spelling last given to Section.
     cfgStr m_strSection;
     /// The sections.
