@@ -1,8 +1,9 @@
 // Opening a configuration file and the reading pass.
 #include <cerrno>
-#include <cstdint>
 #include <cstring>
 #include <ctime>
+#include <functional>
+#include <string_view>
 
 #include "config/class_lock.h"
 #include "config/passes.h"
@@ -119,11 +120,7 @@ class KeyNames {
 public:
     const rvConfig::cfgStr& Get(const char* text)
     {
-        uint32_t hash = 2166136261u;
-        for (const char* c = text; *c != '\0'; ++c) {
-            hash = (hash ^ static_cast<unsigned char>(*c)) * 16777619u;
-        }
-        rvConfig::cfgStr& slot = m_slots[hash % kSlots];
+        rvConfig::cfgStr& slot = m_slots[std::hash<std::string_view>{}(text) % kSlots];
         if (slot.empty() || std::strcmp(slot.c_str(), text) != 0) {
             slot = rvConfig::cfgStr(text);
         }
