@@ -84,7 +84,7 @@ TEST(MThread, TimedWaitRunsOutThenWaitJoinsAndDeliversTheResult)
     }
     int* result = nullptr;
     int status = 0;
-    EXPECT_LE(SecondsFor([&] { status = thread.Wait(&result, nullptr, 1); }), 1.1);
+    EXPECT_LE(SecondsFor([&] { status = thread.Wait(&result, nullptr, 1); }), 1.5);
     EXPECT_EQ(-5, status);
     EXPECT_EQ(ETIMEDOUT, thread.LastError());
     EXPECT_EQ(nullptr, result);
