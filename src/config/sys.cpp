@@ -34,6 +34,12 @@ bool injectedFault(SysCall call, const char* path)
     return true;
 }
 
+// The seam tells the renames apart by what they replace.
+int renameAs(SysCall call, const char* from, const char* to)
+{
+    return injectedFault(call, from) ? -1 : std::rename(from, to);
+}
+
 }  // namespace
 
 void testing::SetFaultHook(FaultHook hook)
@@ -137,18 +143,12 @@ void sys::SyncDirectory(const char* path)
 
 int sys::Rename(const char* from, const char* to)
 {
-    if (injectedFault(SysCall::Rename, from)) {
-        return -1;
-    }
-    return std::rename(from, to);
+    return renameAs(SysCall::Rename, from, to);
 }
 
 int sys::Replace(const char* from, const char* to)
 {
-    if (injectedFault(SysCall::Replace, from)) {
-        return -1;
-    }
-    return std::rename(from, to);
+    return renameAs(SysCall::Replace, from, to);
 }
 
 int sys::Link(const char* from, const char* to)

@@ -7,8 +7,8 @@
 #include "tessaline/crypt/twofish.h"
 
 // Clears both instances (the S-box tables only where reKey will not fill
-// them) and keys them for `direction` (0 encrypt, 1 decrypt)
-// from keyBits / 32 groups of 8 hex digits of keyText (at most 8 groups;
+// them) and keys them for `direction` (0 encrypt, 1 decrypt) from
+// keyBits / 32 groups of 8 hex digits of keyText (at most 8 groups;
 // a group ends early at the text's NUL). Returns 1, or 0 for a null pointer
 // or a refusal of the engine.
 int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char direction,

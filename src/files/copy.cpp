@@ -15,6 +15,7 @@
 #include <sys/stat.h>
 
 #include "files/copy_bytes.h"
+#include "files/handle.h"
 #include "files/open_at.h"
 #include "files/sys.h"
 #include "files/tree.h"
@@ -179,9 +180,9 @@ int CopyOne(const End& source, const End& target, const CopyOptions& options)
     if (tessaline::files::IsDirectoryAt(source.place, sourceInfo) == 1) {
         // Below the host's path the text is not split again: the split asks
         // the file system, which may answer differently by now.
-        rvFilename all(source.place.text, 0);
-        const std::string wildcard =
-            source.below ? std::string(source.place.text) + "/*" : all.File("*");
+        const std::string wildcard = source.below
+                                         ? std::string(source.place.text) + "/*"
+                                         : rvFilename(source.place.text, 0).File("*");
         return CopyMatches(source, wildcard.c_str(), target, options);
     }
     unsigned int overwrite = options.overwrite;

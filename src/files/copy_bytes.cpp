@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstddef>
+#include <cstdint>
 
 #include "files/handle.h"
 #include "files/sys.h"
@@ -57,21 +58,6 @@ void CopyInKernel(void* from, void* to, int64_t* left)
 }
 
 }  // namespace
-
-bool OwnedHandle::IsOpen() const
-{
-    return m_handle != InvalidHandle();
-}
-
-int OwnedHandle::Close()
-{
-    if (!IsOpen()) {
-        return 1;
-    }
-    void* handle = m_handle;
-    m_handle = InvalidHandle();
-    return CloseHandle(handle);
-}
 
 bool CopyBytes(void* from, void* to)
 {

@@ -4,6 +4,8 @@
 
 #include <stdint.h>
 
+#include "tessaline/files/rvFileApi.h"
+
 namespace tessaline::files {
 
 inline int Descriptor(void* handle)
@@ -21,6 +23,32 @@ inline void* InvalidHandle()
 {
     return Handle(-1);
 }
+
+// Owns a handle until Close; the destructor closes one still open.
+class OwnedHandle {
+public:
+    explicit OwnedHandle(void* handle) : m_handle(handle) {}
+    ~OwnedHandle() { Close(); }
+    OwnedHandle(const OwnedHandle&) = delete;
+    OwnedHandle& operator=(const OwnedHandle&) = delete;
+
+    bool IsOpen() const { return m_handle != InvalidHandle(); }
+    void* Get() const { return m_handle; }
+
+    // 1 when the handle closed cleanly (or was not open).
+    int Close()
+    {
+        if (!IsOpen()) {
+            return 1;
+        }
+        void* handle = m_handle;
+        m_handle = InvalidHandle();
+        return CloseHandle(handle);
+    }
+
+private:
+    void* m_handle;
+};
 
 }  // namespace tessaline::files
 

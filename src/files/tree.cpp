@@ -192,9 +192,11 @@ void ForEachEntry(int directory, const char* pattern,
             }
             return;
         }
-        const std::string name = entry->d_name;
-        if (!IsDotOrDotDot(name.c_str()) && fnmatch(pattern, name.c_str(), FNM_PATHNAME) == 0) {
-            visit(name.c_str());
+        // The name stays valid until the next readdir of this listing,
+        // which no visit makes.
+        const char* name = entry->d_name;
+        if (!IsDotOrDotDot(name) && fnmatch(pattern, name, FNM_PATHNAME) == 0) {
+            visit(name);
         }
     }
 }
