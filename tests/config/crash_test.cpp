@@ -18,7 +18,7 @@
 
 namespace {
 
-using tessaline::test::TempDir;
+using tessaline::test::ConfigDir;
 
 constexpr int kSections = 10;
 constexpr int kKeysPerSection = 100;
@@ -113,7 +113,7 @@ protected:
         ASSERT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL);
     }
 
-    TempDir m_dir;
+    ConfigDir m_dir;
     // Loaded once; each child rewrites with its own copy.
     std::unique_ptr<rvConfig> m_config;
     std::string m_sets[2];

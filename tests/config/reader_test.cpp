@@ -15,7 +15,7 @@
 
 namespace {
 
-using tessaline::test::TempDir;
+using tessaline::test::ConfigDir;
 
 const char* lookup(rvConfig& config, const char* key, const char* section)
 {
@@ -67,7 +67,7 @@ TEST(RvConfigReader, SingleLines)
         {"k = \"\"", "defaults", "k", ""},
         {"a b = c", "defaults", "a b", "c"},
     };
-    TempDir dir;
+    ConfigDir dir;
     for (const auto& row : rows) {
         SCOPED_TRACE(row.line);
         const std::string path = dir.Write("line.ini", std::string(row.line) + "\nprobe = 1\n");
@@ -91,7 +91,7 @@ TEST(RvConfigReader, SingleLines)
 
 TEST(RvConfigReader, SectionsAndTheDefaultSection)
 {
-    TempDir dir;
+    ConfigDir dir;
     const std::string path = dir.Write("app.ini",
                                        "# header comment\n"
                                        "   top = 1\r\n"
@@ -139,7 +139,7 @@ TEST(RvConfigReader, KeyNamesKeepTheirSpellingInEverySection)
             text += "k" + std::to_string(section * 7 + key) + " = v\n";
         }
     }
-    TempDir dir;
+    ConfigDir dir;
     rvConfig config(dir.Write("many.ini", text).c_str(), rvConfig::OpenRead);
     for (int section = 0; section < 30; ++section) {
         const std::string name = "s" + std::to_string(section);
@@ -159,7 +159,7 @@ TEST(RvConfigReader, KeyNamesKeepTheirSpellingInEverySection)
 
 TEST(RvConfigReader, ReadReplacesContentAndStartsInTheDefaultSection)
 {
-    TempDir dir;
+    ConfigDir dir;
     const std::string path = dir.Write("app.ini", "above = 1\n[s]\nk = v\n");
     rvConfig config;
     config.PutValue("old", "x", "gone");
@@ -187,7 +187,7 @@ TEST(RvConfigReader, ReadReplacesContentAndStartsInTheDefaultSection)
 
 TEST(RvConfigReader, LongLinesArePieces)
 {
-    TempDir dir;
+    ConfigDir dir;
     const std::string first = "k = " + std::string(4996, 'x');  // 5000 bytes
     const std::string second = "a = " + std::string(4090, 'y') + "b = 2";
     const std::string path = dir.Write("long.ini", first + "\n" + second + "\n");
@@ -200,7 +200,7 @@ TEST(RvConfigReader, LongLinesArePieces)
 
 TEST(RvConfigReader, OpenModes)
 {
-    TempDir dir;
+    ConfigDir dir;
     rvConfig created(dir.Path("missing.ini").c_str(), rvConfig::OpenUpdate);
     EXPECT_TRUE(dir.Exists("missing.ini"));
     EXPECT_EQ(created.IsValid(), 0u);
@@ -221,7 +221,7 @@ TEST(RvConfigReader, OpenModes)
 
 TEST(RvConfigReader, OpenOwnsOneCloseOnExecStream)
 {
-    TempDir dir;
+    ConfigDir dir;
     const std::string path = dir.Write("app.ini", "k = v\n");
     rvConfig config;
     const int before = openDescriptors();
@@ -244,7 +244,7 @@ TEST(RvConfigReader, OpenOwnsOneCloseOnExecStream)
 
 TEST(RvConfigReader, BadInputIsReadWithoutHarm)
 {
-    TempDir dir;
+    ConfigDir dir;
     std::mt19937 random(20240611);
     std::string noise(256 * 1024, '\0');
     for (char& byte : noise) {
@@ -273,7 +273,7 @@ TEST(RvConfigReader, BadInputIsReadWithoutHarm)
 // The only test that waits: three tries one second apart.
 TEST(RvConfigReader, FailedLoadKeepsEverything)
 {
-    TempDir dir;
+    ConfigDir dir;
     const std::string path = dir.Write("unreadable.ini", "k = v\n");
     rvConfig config;
     config.PutValue("mine", "1", "s");

@@ -26,7 +26,7 @@ using tessaline::config::testing::FaultHook;
 using tessaline::config::testing::SetFaultHook;
 using tessaline::config::testing::SysCall;
 using tessaline::test::body;
-using tessaline::test::TempDir;
+using tessaline::test::ConfigDir;
 
 // Large enough that a limit of kFileSizeLimit bytes stops the write.
 std::string oldText(const char* value)
@@ -51,7 +51,7 @@ enum class RealFault { None, FileSizeLimit, ReadOnlyDirectory, BackupIsDirectory
 
 class RealFaultScope {
 public:
-    RealFaultScope(RealFault fault, const TempDir& dir) : m_fault(fault), m_dir(dir)
+    RealFaultScope(RealFault fault, const ConfigDir& dir) : m_fault(fault), m_dir(dir)
     {
         switch (fault) {
         case RealFault::None:
@@ -115,7 +115,7 @@ private:
     }
 
     RealFault m_fault;
-    const TempDir& m_dir;
+    const ConfigDir& m_dir;
     bool m_applied = true;
     rlimit m_oldLimit{};
     sighandler_t m_oldSignal = SIG_DFL;
@@ -136,7 +136,7 @@ struct FaultCase {
     Content temp;
 };
 
-std::string expand(std::string text, const TempDir& dir)
+std::string expand(std::string text, const ConfigDir& dir)
 {
     for (const auto& [mark, name] : {std::pair<std::string, std::string>{"{ini}", "app.ini"}, {"{new}", "app.new"}}) {
         for (std::size_t at = text.find(mark); at != std::string::npos; at = text.find(mark)) {
@@ -146,7 +146,7 @@ std::string expand(std::string text, const TempDir& dir)
     return text;
 }
 
-void expectContent(const TempDir& dir, const char* name, Content expected)
+void expectContent(const ConfigDir& dir, const char* name, Content expected)
 {
     SCOPED_TRACE(name);
     switch (expected) {
@@ -216,7 +216,7 @@ TEST(RvConfigReplace, EveryFaultKeepsTheData)
     };
     for (const FaultCase& row : cases) {
         SCOPED_TRACE(row.what);
-        TempDir dir;
+        ConfigDir dir;
         rvConfig config(dir.Write("app.ini", oldText("1")).c_str(), rvConfig::OpenUpdate);
         config.PutValue("k", "2", "");
         rvConfig::m_bBackups = row.backups;
@@ -255,8 +255,8 @@ TEST(RvConfigReplace, NothingIsWrittenThroughAPlantedTemporaryName)
     };
     for (const auto& plant : plants) {
         SCOPED_TRACE(plant.what);
-        TempDir dir;
-        TempDir elsewhere;
+        ConfigDir dir;
+        ConfigDir elsewhere;
         const std::string victim = elsewhere.Write("victim", "not yours\n");
         const std::string temp = dir.Path("app.new");
         ASSERT_EQ(plant.plant(victim.c_str(), temp.c_str()), 0);
@@ -269,8 +269,8 @@ TEST(RvConfigReplace, NothingIsWrittenThroughAPlantedTemporaryName)
     }
     {
         // A dangling link must not make the writer create its target.
-        TempDir dir;
-        TempDir elsewhere;
+        ConfigDir dir;
+        ConfigDir elsewhere;
         ASSERT_EQ(symlink(elsewhere.Path("created").c_str(), dir.Path("app.new").c_str()), 0);
         rvConfig config(dir.Write("app.ini", oldText("1")).c_str(), rvConfig::OpenUpdate);
         config.PutValue("k", "2", "");
@@ -303,7 +303,7 @@ TEST(RvConfigReplace, RewrittenFileKeepsItsPermissions)
     for (unsigned int backups : {0u, 1u}) {
         for (const auto& row : rows) {
             SCOPED_TRACE(std::to_string(row.oldMode) + " backups " + std::to_string(backups));
-            TempDir dir;
+            ConfigDir dir;
             const std::string path = dir.Path("app.ini");
             if (row.oldMode >= 0) {
                 dir.Write("app.ini", oldText("1"));

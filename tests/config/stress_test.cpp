@@ -14,7 +14,7 @@
 
 namespace {
 
-using tessaline::test::TempDir;
+using tessaline::test::ConfigDir;
 using Clock = std::chrono::steady_clock;
 
 constexpr int kThreads = 8;
@@ -178,7 +178,7 @@ std::map<std::string, std::string> contents(rvConfig& config)
 
 TEST(Stress, SharedConfigurationsAndThreadClasses)
 {
-    TempDir dir;
+    ConfigDir dir;
     rvConfig first(dir.Write("first.ini", "# shared\n[common]\ncounter = 0\n").c_str(), rvConfig::OpenUpdate);
     rvConfig second(dir.Write("second.ini", "# shared\n[common]\ncounter = 0\n").c_str(), rvConfig::OpenUpdate);
     Shared shared;

@@ -15,13 +15,13 @@ namespace {
 
 using tessaline::config::testing::SetFaultHook;
 using tessaline::config::testing::SysCall;
-using tessaline::test::TempDir;
+using tessaline::test::ConfigDir;
 using tessaline::test::body;
 using Change = std::function<void(rvConfig&)>;
 
 std::string rewrite(const std::string& content, const Change& change)
 {
-    TempDir dir;
+    ConfigDir dir;
     rvConfig config(dir.Write("app.ini", content).c_str(), rvConfig::OpenUpdate);
     change(config);
     config.IsModified(1);
@@ -109,7 +109,7 @@ TEST(RvConfigWriter, LayoutSurvives)
 
 TEST(RvConfigWriter, TextGoesOutUnescaped)
 {
-    TempDir dir;
+    ConfigDir dir;
     const std::string path = dir.Write("app.ini", std::string(5000, '#') + "\n");
     rvConfig config(path.c_str(), rvConfig::OpenUpdate);
     config.PutValue("k", "  padded  ", "");
@@ -130,7 +130,7 @@ TEST(RvConfigWriter, TextGoesOutUnescaped)
 
 TEST(RvConfigWriter, FlushStates)
 {
-    TempDir dir;
+    ConfigDir dir;
     const std::string path = dir.Write("app.ini", "[s]\nk = 1\n");
     rvConfig config(path.c_str(), rvConfig::OpenUpdate);
     EXPECT_EQ(config.Flush(1), 1u);  // unmodified: no file touched, still cleared
@@ -184,7 +184,7 @@ TEST(RvConfigWriter, BackupsNeverTakeTheFilesOwnName)
     rvConfig::m_bBackups = 1;
     for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
-        TempDir dir;
+        ConfigDir dir;
         rvConfig config(dir.Write(row.name, "k = 1\n").c_str(), rvConfig::OpenUpdate);
         for (const char* value : {"2", "3"}) {
             config.PutValue("k", value, "");
@@ -198,7 +198,7 @@ TEST(RvConfigWriter, BackupsNeverTakeTheFilesOwnName)
 
 TEST(RvConfigWriter, RefusalsLeaveEverything)
 {
-    TempDir dir;
+    ConfigDir dir;
     const std::string path = dir.Write("app.ini", "k = 1\n");
     rvConfig unnamed;
     unnamed.Mode(rvConfig::OpenUpdate);
