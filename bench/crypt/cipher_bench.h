@@ -107,6 +107,88 @@ void MeasureThroughput(benchmark::State& state, std::size_t bytesPerIteration, B
     state.counters["cycles/byte"] = cpuSeconds * hz / bytes;
 }
 
+namespace peer {
+
+// The groups of a standard-Twofish peer, given as a class that is built
+// unkeyed and has
+//   void SetKey(std::size_t keyBytes, bool encrypt);  // Key256()'s first bytes
+//   void Encrypt(const uint8_t* in, uint8_t* out, std::size_t bytes);
+//   void Decrypt(const uint8_t* in, uint8_t* out, std::size_t bytes);
+// A peer with one schedule for both directions ignores `encrypt`.
+template <typename Peer>
+void EcbBench(benchmark::State& state, bool encrypt)
+{
+    Peer cipher;
+    cipher.SetKey(16, encrypt);
+    std::vector<uint8_t> in = Input(kEcbBytes), out(kEcbBytes);
+    MeasureThroughput(state, kEcbBytes, [&] {
+        if (encrypt)
+            cipher.Encrypt(in.data(), out.data(), kEcbBytes);
+        else
+            cipher.Decrypt(in.data(), out.data(), kEcbBytes);
+        benchmark::DoNotOptimize(out.data());
+    });
+}
+
+template <typename Peer>
+void KeySetupBench(benchmark::State& state, std::size_t bytes)
+{
+    Peer cipher;
+    for (auto _ : state) {
+        cipher.SetKey(bytes, true);
+        benchmark::DoNotOptimize(&cipher);
+        benchmark::ClobberMemory();
+    }
+}
+
+// Key setup, four blocks and the hex step, as a host that keys per message.
+template <typename Peer>
+void TextEncryptBench(benchmark::State& state)
+{
+    std::vector<uint8_t> value = Input(kTextBytes);
+    uint8_t blocks[kTextBytes];
+    char text[2 * kTextBytes + 1];
+    Peer cipher;
+    for (auto _ : state) {
+        cipher.SetKey(16, true);
+        cipher.Encrypt(value.data(), blocks, kTextBytes);
+        ToHex(blocks, kTextBytes, text);
+        benchmark::DoNotOptimize(text);
+    }
+}
+
+template <typename Peer>
+void TextDecryptBench(benchmark::State& state)
+{
+    char text[2 * kTextBytes + 1];
+    ToHex(Input(kTextBytes).data(), kTextBytes, text);
+    uint8_t blocks[kTextBytes], out[kTextBytes];
+    Peer cipher;
+    for (auto _ : state) {
+        FromHex(text, kTextBytes, blocks);
+        cipher.SetKey(16, false);
+        cipher.Decrypt(blocks, out, kTextBytes);
+        benchmark::DoNotOptimize(out);
+    }
+}
+
+}  // namespace peer
+
+// Registers the groups of `Peer` (see peer::EcbBench) under `impl`.
+template <typename Peer>
+bool RegisterPeer(const char* impl)
+{
+    bench::Register("crypt_ecb_encrypt", impl, kEcbSize, peer::EcbBench<Peer>, true)
+        ->Unit(benchmark::kMillisecond);
+    bench::Register("crypt_ecb_decrypt", impl, kEcbSize, peer::EcbBench<Peer>, false)
+        ->Unit(benchmark::kMillisecond);
+    bench::Register("crypt_key_setup", impl, "128", peer::KeySetupBench<Peer>, std::size_t{16});
+    bench::Register("crypt_key_setup", impl, "256", peer::KeySetupBench<Peer>, std::size_t{32});
+    bench::Register("crypt_text_encrypt", impl, kTextSize, peer::TextEncryptBench<Peer>);
+    bench::Register("crypt_text_decrypt", impl, kTextSize, peer::TextDecryptBench<Peer>);
+    return true;
+}
+
 }  // namespace cipher_bench
 
 #endif
