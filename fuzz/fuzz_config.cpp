@@ -145,7 +145,10 @@ bool KeepsStructure(const Entry& entry)
            entry.key.size() + 3 + entry.value.size() < kLinePiece;
 }
 
-bool SameName(const std::string& a, const std::string& b) { return strcasecmp(a.c_str(), b.c_str()) == 0; }
+bool SameName(const std::string& a, const std::string& b)
+{
+    return strcasecmp(a.c_str(), b.c_str()) == 0;
+}
 
 // Check 2: `written` was flushed, `read` is what the file gave back.
 void CheckReadBack(const Table& written, const Table& read, rvConfig& reader, const std::string& file)
@@ -162,11 +165,11 @@ void CheckReadBack(const Table& written, const Table& read, rvConfig& reader, co
         }
         if (entry.section.empty())
             continue;
-        const char* value = reader.GetValue(entry.key.c_str(), static_cast<const char*>(nullptr),
-                                            entry.section.c_str());
+        const char* value =
+            reader.GetValue(entry.key.c_str(), static_cast<const char*>(nullptr), entry.section.c_str());
         if (value == nullptr || entry.value != value) {
-            fprintf(stderr, "[%s] %s = %s read back as %s from:\n%s---\n", entry.section.c_str(),
-                    entry.key.c_str(), entry.value.c_str(), value ? value : "(missing)", file.c_str());
+            fprintf(stderr, "[%s] %s = %s read back as %s from:\n%s---\n", entry.section.c_str(), entry.key.c_str(),
+                    entry.value.c_str(), value ? value : "(missing)", file.c_str());
             FUZZ_CHECK(value != nullptr && entry.value == value);
         }
     }

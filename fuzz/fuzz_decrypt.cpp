@@ -63,8 +63,7 @@ Result Decrypt(Decrypter which, const std::string& key, const std::string& text,
         again.status = TwoFishDecrypt(keyCopy.data(), textCopy.data(), guarded.data(), &again.length);
     for (size_t i = room; i < guarded.size(); ++i)
         FUZZ_CHECK(guarded[i] == kCanary);
-    FUZZ_CHECK(again.status == result.status && again.length == result.length &&
-               again.wasPlain == result.wasPlain);
+    FUZZ_CHECK(again.status == result.status && again.length == result.length && again.wasPlain == result.wasPlain);
     if (result.status == 1) {
         // Empty text leaves *length as it was and stores only the NUL.
         const size_t written = which == Decrypter::kText && text.empty() ? 1 : result.length;
@@ -76,7 +75,10 @@ Result Decrypt(Decrypter which, const std::string& key, const std::string& text,
 }
 
 // Text and key as the library sees them: up to their first NUL.
-std::string CString(std::string text) { return std::string(text.c_str()); }
+std::string CString(std::string text)
+{
+    return std::string(text.c_str());
+}
 
 // Arbitrary text, shaped on request like the marked form ("D9", a multiple
 // of 32 characters, "AB") or the chained form (80 characters), which random

@@ -69,8 +69,8 @@ constexpr size_t kSearchEveryStepUpTo = 2 * 4096;
 
 void CheckObject(rvFilename& name, bool last)
 {
-    for (const char* part : {name.Scheme(), name.Server(), name.FullDirectory(), name.Directory(),
-                             name.File(), name.Ext(), name(), static_cast<const char*>(name)}) {
+    for (const char* part : {name.Scheme(), name.Server(), name.FullDirectory(), name.Directory(), name.File(),
+                             name.Ext(), name(), static_cast<const char*>(name)}) {
         FUZZ_CHECK(part != nullptr);
         (void)strlen(part);
     }
@@ -163,11 +163,21 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
         case 2: {
             const char* text = TakeArgument(input, name, keep);
             switch (input.ConsumeIntegralInRange(0, 4)) {
-            case 0: name.Scheme(text); break;
-            case 1: name.Server(text); break;
-            case 2: name.Directory(text); break;
-            case 3: name.File(text); break;
-            default: name.Ext(text); break;
+            case 0:
+                name.Scheme(text);
+                break;
+            case 1:
+                name.Server(text);
+                break;
+            case 2:
+                name.Directory(text);
+                break;
+            case 3:
+                name.File(text);
+                break;
+            default:
+                name.Ext(text);
+                break;
             }
             break;
         }

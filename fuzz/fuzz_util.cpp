@@ -198,11 +198,22 @@ std::string ModelSpan(const std::string& format, long span)
         if (++i == format.size())
             break;
         switch (format[i]) {
-        case 'D': snprintf(number, sizeof number, "%ld", span / 86400); break;
-        case 'H': snprintf(number, sizeof number, "%02ld", span / 3600 - 24 * (span / 86400)); break;
-        case 'M': snprintf(number, sizeof number, "%02ld", span / 60 - 60 * (span / 3600)); break;
-        case 'S': snprintf(number, sizeof number, "%02ld", span % 60); break;
-        default: number[0] = format[i]; number[1] = '\0'; break;
+        case 'D':
+            snprintf(number, sizeof number, "%ld", span / 86400);
+            break;
+        case 'H':
+            snprintf(number, sizeof number, "%02ld", span / 3600 - 24 * (span / 86400));
+            break;
+        case 'M':
+            snprintf(number, sizeof number, "%02ld", span / 60 - 60 * (span / 3600));
+            break;
+        case 'S':
+            snprintf(number, sizeof number, "%02ld", span % 60);
+            break;
+        default:
+            number[0] = format[i];
+            number[1] = '\0';
+            break;
         }
         result += number;
     }
@@ -211,8 +222,8 @@ std::string ModelSpan(const std::string& format, long span)
 
 void CheckSpanFormat(FuzzedDataProvider& input)
 {
-    const long seconds = input.ConsumeBool() ? input.ConsumeIntegralInRange<long>(-400000, 400000)
-                                             : input.ConsumeIntegral<long>();
+    const long seconds =
+        input.ConsumeBool() ? input.ConsumeIntegralInRange<long>(-400000, 400000) : input.ConsumeIntegral<long>();
     const rvTimeSpan span(seconds);
     const std::string format = TakeCString(input, 128);
     const std::string expected = ModelSpan(format, seconds);
@@ -268,12 +279,24 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
 {
     FuzzedDataProvider input(data, size);
     switch (input.ConsumeIntegralInRange(0, 6)) {
-    case 0: CheckHashToken(input); break;
-    case 1: CheckTextToNumber(input); break;
-    case 2: CheckNumberToText(input); break;
-    case 3: CheckTimeFormat(input); break;
-    case 4: CheckSpanFormat(input); break;
-    default: CheckStrings(input); break;
+    case 0:
+        CheckHashToken(input);
+        break;
+    case 1:
+        CheckTextToNumber(input);
+        break;
+    case 2:
+        CheckNumberToText(input);
+        break;
+    case 3:
+        CheckTimeFormat(input);
+        break;
+    case 4:
+        CheckSpanFormat(input);
+        break;
+    default:
+        CheckStrings(input);
+        break;
     }
     return 0;
 }

@@ -19,8 +19,8 @@ inline std::string Name(const std::string& group, const std::string& impl, const
 
 // Registers `function(state, extra...)` under the suite's name.
 template <typename Function, typename... Extra>
-benchmark::internal::Benchmark* Register(const std::string& group, const std::string& impl,
-                                         const std::string& size, Function function, Extra... extra)
+benchmark::internal::Benchmark* Register(const std::string& group, const std::string& impl, const std::string& size,
+                                         Function function, Extra... extra)
 {
     return benchmark::RegisterBenchmark(Name(group, impl, size).c_str(),
                                         [=](benchmark::State& state) { function(state, extra...); });

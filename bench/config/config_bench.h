@@ -74,8 +74,8 @@ inline std::vector<std::pair<Name, std::string>> Changes(const Size& size, long 
     for (int n = 0; n < count; ++n) {
         const int i = (n * 7919) % size.sections;
         const int j = static_cast<int>((n * 104729L + round) % size.keys);
-        changes.push_back({Name{"Section" + std::to_string(i), "key" + std::to_string(j)},
-                           "changed " + std::to_string(round)});
+        changes.push_back(
+            {Name{"Section" + std::to_string(i), "key" + std::to_string(j)}, "changed " + std::to_string(round)});
     }
     return changes;
 }

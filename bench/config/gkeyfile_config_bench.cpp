@@ -67,7 +67,6 @@ void Flush(benchmark::State& state, Size size)
     CountEntries(state, size);
 }
 
-
 [[maybe_unused]] const bool registered = [] {
     RegisterLoadLookup("gkeyfile", Load, Lookup);
     RegisterFlush("gkeyfile", Flush);

@@ -32,7 +32,6 @@ void Lookup(benchmark::State& state, Size size)
     CountEntries(state, size);
 }
 
-
 [[maybe_unused]] const bool registered = [] {
     RegisterLoadLookup("inih", Load, Lookup);
     return true;

@@ -53,7 +53,6 @@ void Flush(benchmark::State& state, Size size)
     CountEntries(state, size);
 }
 
-
 [[maybe_unused]] const bool registered = [] {
     RegisterLoadLookup("ptree", Load, Lookup);
     RegisterFlush("ptree", Flush);

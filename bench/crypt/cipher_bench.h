@@ -178,10 +178,8 @@ void TextDecryptBench(benchmark::State& state)
 template <typename Peer>
 bool RegisterPeer(const char* impl)
 {
-    bench::Register("crypt_ecb_encrypt", impl, kEcbSize, peer::EcbBench<Peer>, true)
-        ->Unit(benchmark::kMillisecond);
-    bench::Register("crypt_ecb_decrypt", impl, kEcbSize, peer::EcbBench<Peer>, false)
-        ->Unit(benchmark::kMillisecond);
+    bench::Register("crypt_ecb_encrypt", impl, kEcbSize, peer::EcbBench<Peer>, true)->Unit(benchmark::kMillisecond);
+    bench::Register("crypt_ecb_decrypt", impl, kEcbSize, peer::EcbBench<Peer>, false)->Unit(benchmark::kMillisecond);
     bench::Register("crypt_key_setup", impl, "128", peer::KeySetupBench<Peer>, std::size_t{16});
     bench::Register("crypt_key_setup", impl, "256", peer::KeySetupBench<Peer>, std::size_t{32});
     bench::Register("crypt_text_encrypt", impl, kTextSize, peer::TextEncryptBench<Peer>);

@@ -70,10 +70,8 @@ void TextDecryptBench(benchmark::State& state)
 }
 
 [[maybe_unused]] const bool registered = [] {
-    bench::Register("crypt_ecb_encrypt", "tessaline", kEcbSize, EcbBench, DIR_ENCRYPT)
-        ->Unit(benchmark::kMillisecond);
-    bench::Register("crypt_ecb_decrypt", "tessaline", kEcbSize, EcbBench, DIR_DECRYPT)
-        ->Unit(benchmark::kMillisecond);
+    bench::Register("crypt_ecb_encrypt", "tessaline", kEcbSize, EcbBench, DIR_ENCRYPT)->Unit(benchmark::kMillisecond);
+    bench::Register("crypt_ecb_decrypt", "tessaline", kEcbSize, EcbBench, DIR_DECRYPT)->Unit(benchmark::kMillisecond);
     bench::Register("crypt_key_setup", "tessaline", "128", KeySetupBench, 128);
     bench::Register("crypt_key_setup", "tessaline", "256", KeySetupBench, 256);
     bench::Register("crypt_text_encrypt", "tessaline", kTextSize, TextEncryptBench);

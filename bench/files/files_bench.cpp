@@ -345,9 +345,8 @@ using WalkFunction = int (*)(const std::string&);
     };
     for (const int entries : kWalkSizes) {
         for (const auto& w : walkers) {
-            WallClock(bench::Register("files_walk", w.impl, std::to_string(entries), [=](benchmark::State& state) {
-                WalkBench(state, entries, w.walk);
-            }));
+            WallClock(bench::Register("files_walk", w.impl, std::to_string(entries),
+                                      [=](benchmark::State& state) { WalkBench(state, entries, w.walk); }));
         }
     }
     // Last: the dirty pages of a 256 MiB copy slow every write that
@@ -355,9 +354,8 @@ using WalkFunction = int (*)(const std::string&);
     for (const auto& c : copiers) {
         if (c.copyFile != nullptr) {
             const std::string target = std::string("large.") + c.impl;
-            WallClock(bench::Register("files_copy_large", c.impl, "256MiB", [=](benchmark::State& state) {
-                CopyLarge(state, target.c_str(), c.copyFile);
-            }));
+            WallClock(bench::Register("files_copy_large", c.impl, "256MiB",
+                                      [=](benchmark::State& state) { CopyLarge(state, target.c_str(), c.copyFile); }));
         }
     }
     return true;

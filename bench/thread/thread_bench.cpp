@@ -163,30 +163,31 @@ void PthreadCreateJoin(benchmark::State& state)
     const char* uncontended = "uncontended";
     bench::Register("thread_mutex_plain", "tessaline", uncontended, MMutexBench, MMutex_::MutexPlain);
     bench::Register("thread_mutex_plain", "std_mutex", uncontended, StdMutexBench<std::mutex>);
-    bench::Register("thread_mutex_plain", "pthread", uncontended, PthreadMutexBench,
-                    int{PTHREAD_MUTEX_DEFAULT});
-    bench::Register("thread_mutex_recursive", "tessaline", uncontended, MMutexBench,
-                    MMutex_::MutexRecursive);
-    bench::Register("thread_mutex_recursive", "std_recursive_mutex", uncontended,
-                    StdMutexBench<std::recursive_mutex>);
-    bench::Register("thread_mutex_recursive", "pthread", uncontended, PthreadMutexBench,
-                    int{PTHREAD_MUTEX_RECURSIVE});
+    bench::Register("thread_mutex_plain", "pthread", uncontended, PthreadMutexBench, int{PTHREAD_MUTEX_DEFAULT});
+    bench::Register("thread_mutex_recursive", "tessaline", uncontended, MMutexBench, MMutex_::MutexRecursive);
+    bench::Register("thread_mutex_recursive", "std_recursive_mutex", uncontended, StdMutexBench<std::recursive_mutex>);
+    bench::Register("thread_mutex_recursive", "pthread", uncontended, PthreadMutexBench, int{PTHREAD_MUTEX_RECURSIVE});
     bench::Register("thread_mutex_checked", "tessaline", uncontended, MMutexBench, MMutex_::MutexChecked);
     bench::Register("thread_mutex_checked", "pthread_errorcheck", uncontended, PthreadMutexBench,
                     int{PTHREAD_MUTEX_ERRORCHECK});
     bench::Register("thread_condvar_pingpong", "tessaline", "round_trip", MCondVarPingPong)
-        ->UseRealTime()->Unit(benchmark::kMicrosecond);
-    bench::Register("thread_condvar_pingpong", "std_condition_variable", "round_trip",
-                    StdConditionVariablePingPong)
-        ->UseRealTime()->Unit(benchmark::kMicrosecond);
+        ->UseRealTime()
+        ->Unit(benchmark::kMicrosecond);
+    bench::Register("thread_condvar_pingpong", "std_condition_variable", "round_trip", StdConditionVariablePingPong)
+        ->UseRealTime()
+        ->Unit(benchmark::kMicrosecond);
     bench::Register("thread_create_join", "tessaline", "empty_routine", MThreadCreateWait, -1L)
-        ->UseRealTime()->Unit(benchmark::kMicrosecond);
+        ->UseRealTime()
+        ->Unit(benchmark::kMicrosecond);
     bench::Register("thread_create_join", "tessaline_timed_wait", "empty_routine", MThreadCreateWait, 0L)
-        ->UseRealTime()->Unit(benchmark::kMicrosecond);
+        ->UseRealTime()
+        ->Unit(benchmark::kMicrosecond);
     bench::Register("thread_create_join", "std_thread", "empty_routine", StdThreadCreateJoin)
-        ->UseRealTime()->Unit(benchmark::kMicrosecond);
+        ->UseRealTime()
+        ->Unit(benchmark::kMicrosecond);
     bench::Register("thread_create_join", "pthread", "empty_routine", PthreadCreateJoin)
-        ->UseRealTime()->Unit(benchmark::kMicrosecond);
+        ->UseRealTime()
+        ->Unit(benchmark::kMicrosecond);
     return true;
 }();
 

@@ -67,15 +67,16 @@ int main()
         std::printf("level: %s\n", config.GetValue("level", "warning", "logging"));
         std::printf("timeout (missing): %s\n", config.GetValue("timeout", "30", "server"));
 
-        config.PutValue("port", 9090, "server");            // change a value
-        config.PutValue("timeout", 45, "server");           // add a key
+        config.PutValue("port", 9090, "server");             // change a value
+        config.PutValue("timeout", 45, "server");            // add a key
         config.PutValue("path", "/var/cache/app", "cache");  // add a section
         std::printf("modified: %u\n", config.IsModified());
         std::printf("saved: %u\n", config.Flush(0));
     }
 
-    std::printf("\nThe saved file: comments stay, a new key ends its section (after the\n"
-                "blank line that closed it), a new section comes last.\n");
+    std::printf(
+        "\nThe saved file: comments stay, a new key ends its section (after the\n"
+        "blank line that closed it), a new section comes last.\n");
     printFile(path);
 
     rvConfig reread(path.c_str(), rvConfig::OpenRead);

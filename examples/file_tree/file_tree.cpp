@@ -19,8 +19,8 @@ namespace {
 
 void showParts(rvFilename& name)
 {
-    std::printf("%s\n  scheme \"%s\" server \"%s\" directory \"%s\" file \"%s\" ext \"%s\"\n", name(),
-                name.Scheme(), name.Server(), name.Directory(), name.File(), name.Ext());
+    std::printf("%s\n  scheme \"%s\" server \"%s\" directory \"%s\" file \"%s\" ext \"%s\"\n", name(), name.Scheme(),
+                name.Server(), name.Directory(), name.File(), name.Ext());
 }
 
 void writeFile(const std::string& path, const char* text)
@@ -88,8 +88,8 @@ int main()
     std::printf("the copy has all of the source: %d\n", CompareDirectoriesByFileSize(source.c_str(), copy.c_str()));
 
     // A wildcard copies the matches into a directory; recurse 0 skips notes/.
-    std::printf("copied docs/*: %d files\n", rvCopyFile((source + "/docs/*").c_str(), (scratch + "/flat").c_str(), 0,
-                                                      1, 0, 0, nullptr, nullptr, 0644));
+    std::printf("copied docs/*: %d files\n", rvCopyFile((source + "/docs/*").c_str(), (scratch + "/flat").c_str(), 0, 1,
+                                                        0, 0, nullptr, nullptr, 0644));
 
     writeFile(copy + "/logs/app.log", "started\n");
     std::printf("after a change in the copy: %d\n", CompareDirectoriesByFileSize(source.c_str(), copy.c_str()));

@@ -70,8 +70,7 @@ int main()
     backLength = sizeof back - 1;
     const int status = TwoFishDecrypt(wrongKey, hex, back, &backLength);
     std::printf("with a wrong key: status %d, same text: %s\n", status,
-                backLength == std::strlen(reinterpret_cast<char*>(note)) &&
-                        std::memcmp(back, note, backLength) == 0
+                backLength == std::strlen(reinterpret_cast<char*>(note)) && std::memcmp(back, note, backLength) == 0
                     ? "yes"
                     : "no");
     return 0;

@@ -82,8 +82,9 @@ void changeAndSave()
         config.PutBool("enabled", 0, "logging");
         std::printf("saved: %u\n", config.Flush(0));
     }
-    std::printf("\nThe saved copy: comments and layout stay, new keys end their section,\n"
-                "the new section comes last.\n");
+    std::printf(
+        "\nThe saved copy: comments and layout stay, new keys end their section,\n"
+        "the new section comes last.\n");
     printFile(path);
     unlink(path.c_str());
     rmdir(directory);

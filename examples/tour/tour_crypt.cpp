@@ -14,8 +14,8 @@ void ShowDecrypted(const char* label, char* stored)
     unsigned int wasPlain = 0;
     const int ok = rvDecrypt(stored, value, &length, &wasPlain);
     value[length] = '\0';
-    std::printf("%s: rvDecrypt -> %d, \"%s\" (%lu bytes, wasPlain %u)\n", label, ok,
-                reinterpret_cast<char*>(value), length, wasPlain);
+    std::printf("%s: rvDecrypt -> %d, \"%s\" (%lu bytes, wasPlain %u)\n", label, ok, reinterpret_cast<char*>(value),
+                length, wasPlain);
 }
 
 }  // namespace

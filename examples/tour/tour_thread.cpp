@@ -49,8 +49,7 @@ void TourThread()
     MThread adder(MThread_::PriorityNormal);
     std::printf("adder started: %d\n", adder.Create(AddUp, &goAhead, 0, 0, 0, nullptr));
     int* sum = nullptr;
-    std::printf("Wait for 1 ms while it waits for the go-ahead: %d (time ran out)\n",
-                adder.Wait(&sum, nullptr, 1));
+    std::printf("Wait for 1 ms while it waits for the go-ahead: %d (time ran out)\n", adder.Wait(&sum, nullptr, 1));
     goAhead.Signal();
     int status = adder.Wait(&sum, nullptr, -1);
     std::printf("after the go-ahead, Wait joins it: %d, its result %d\n", status, *sum);
@@ -65,7 +64,6 @@ void TourThread()
     // it was quicker, no thread left to wait for (-1).
     status = sleeper.thread.Wait(nullptr, nullptr, 0);
     std::printf("Cancel during its Pause, then Wait: %s; cancelled %d, detached %s, exists %s\n",
-                status == 3 || status == -1 ? "it went away" : "unexpected",
-                sleeper.thread.m_cancelled, sleeper.thread.m_state == 3 ? "yes" : "no",
-                sleeper.thread.Exists() ? "yes" : "no");
+                status == 3 || status == -1 ? "it went away" : "unexpected", sleeper.thread.m_cancelled,
+                sleeper.thread.m_state == 3 ? "yes" : "no", sleeper.thread.Exists() ? "yes" : "no");
 }

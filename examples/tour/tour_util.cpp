@@ -21,8 +21,8 @@ void TourUtil()
     std::printf("_strupr gives \"%s\"\n", _strupr(line));
 
     char number[72];
-    std::printf("rv_itoa(255, 16) = %s, rv_itoa(-1, 16) = %s, _i64toa(-42, 10) = %s\n",
-                rv_itoa(255, number, 16), rv_itoa(-1, number + 24, 16), _i64toa(-42, number + 48, 10));
+    std::printf("rv_itoa(255, 16) = %s, rv_itoa(-1, 16) = %s, _i64toa(-42, 10) = %s\n", rv_itoa(255, number, 16),
+                rv_itoa(-1, number + 24, 16), _i64toa(-42, number + 48, 10));
     std::printf("_atoi64(\"-1,234,567\") = %lld\n", _atoi64("-1,234,567"));
 
     for (const char* word : {"GETALL", "get", "Put", "list"}) {

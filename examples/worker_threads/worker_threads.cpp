@@ -91,8 +91,7 @@ int main()
     heldUp.Create(answerWhenLetGo, &gate, 0, 0, 0, nullptr);
     int* answer = nullptr;
     // Timeouts have a grain of whole seconds: this waits up to one second.
-    std::printf("\nWait 200 ms for a thread that is held up: %d (time ran out)\n",
-                heldUp.Wait(&answer, nullptr, 200));
+    std::printf("\nWait 200 ms for a thread that is held up: %d (time ran out)\n", heldUp.Wait(&answer, nullptr, 200));
     gate.Signal();
     const int status = heldUp.Wait(&answer, nullptr, 5000);
     std::printf("let go, then Wait: %d, it answered %d\n", status, answer != nullptr ? *answer : -1);

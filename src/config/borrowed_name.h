@@ -26,8 +26,8 @@ public:
         // The leaf points at the caller's characters. Its count starts at
         // two, one of which is never released, so no copy made during the
         // lookup can bring it to zero and free the caller's text.
-        _RopeLeaf* leaf = ::new (static_cast<void*>(m_leaf)) _RopeLeaf(const_cast<char*>(text), std::strlen(text),
-                                                                        get_allocator());
+        _RopeLeaf* leaf =
+            ::new (static_cast<void*>(m_leaf)) _RopeLeaf(const_cast<char*>(text), std::strlen(text), get_allocator());
         leaf->_M_ref_count = 2;
         this->_M_tree_ptr = leaf;
     }

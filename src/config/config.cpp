@@ -134,7 +134,7 @@ unsigned int rvConfig::IsValid()
 }
 
 unsigned int tessaline::config::FindValue(rvConfig& config, const rvConfig::cfgStr& key, rvConfig::cfgStr* value,
-                                         const rvConfig::cfgStr& section)
+                                          const rvConfig::cfgStr& section)
 {
     ScopedClassLock lock;
     const rvConfig::cfgStr& name = section.empty() ? config.m_strSection : section;
@@ -152,12 +152,14 @@ unsigned int tessaline::config::FindValue(rvConfig& config, const rvConfig::cfgS
 }
 
 // The by-value parameters are the interface's fixed signature.
-unsigned int rvConfig::_GetValue(cfgStr key, cfgStr* value, cfgStr section)  // NOLINT(performance-unnecessary-value-param)
+// NOLINTNEXTLINE(performance-unnecessary-value-param)
+unsigned int rvConfig::_GetValue(cfgStr key, cfgStr* value, cfgStr section)
 {
     return tessaline::config::FindValue(*this, key, value, section);
 }
 
-unsigned int rvConfig::_PutValue(cfgStr key, cfgStr value, cfgStr section)  // NOLINT(performance-unnecessary-value-param)
+// NOLINTNEXTLINE(performance-unnecessary-value-param)
+unsigned int rvConfig::_PutValue(cfgStr key, cfgStr value, cfgStr section)
 {
     ScopedClassLock lock;
     const cfgStr& name = section.empty() ? m_strSection : section;

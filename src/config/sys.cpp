@@ -130,8 +130,8 @@ void sys::SyncDirectory(const char* path)
 {
     const char* slash = std::strrchr(path, '/');
     const std::string directory = slash == nullptr ? std::string(".")
-                                  : slash == path ? std::string("/")
-                                                  : std::string(path, slash - path);
+                                  : slash == path  ? std::string("/")
+                                                   : std::string(path, slash - path);
     const int saved = errno;
     const int fd = open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
     if (fd >= 0) {

@@ -18,8 +18,8 @@ constexpr std::size_t kChainedString = 36;
 
 bool isMarked(const char* text, std::size_t size)
 {
-    return size > 2 * kMarkBytes && (size - 2 * kMarkBytes) % kHexPerBlock == 0 &&
-           text[0] == 'D' && text[1] == '9' && text[size - 2] == 'A' && text[size - 1] == 'B';
+    return size > 2 * kMarkBytes && (size - 2 * kMarkBytes) % kHexPerBlock == 0 && text[0] == 'D' && text[1] == '9' &&
+           text[size - 2] == 'A' && text[size - 1] == 'B';
 }
 
 // Each byte of the chained form is stored xor the byte after it.
@@ -99,7 +99,8 @@ __attribute__((noinline))
 #else
 __attribute__((noipa))
 #endif
-unsigned long TwoFishHere(unsigned long)
+unsigned long
+TwoFishHere(unsigned long)
 {
     return reinterpret_cast<unsigned long>(__builtin_return_address(0));
 }

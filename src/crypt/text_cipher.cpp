@@ -28,7 +28,9 @@ constexpr char kHexDigits[] = "0123456789ABCDEF";
 class SecretBuffer {
 public:
     explicit SecretBuffer(std::size_t size)
-        : m_size(size), m_bytes(static_cast<unsigned char*>(std::calloc(size ? size : 1, 1))) {}
+        : m_size(size), m_bytes(static_cast<unsigned char*>(std::calloc(size ? size : 1, 1)))
+    {
+    }
     ~SecretBuffer()
     {
         if (m_bytes != nullptr) {
@@ -88,8 +90,7 @@ uint32_t keyGroupValue(const char* group)
 
 }  // namespace
 
-int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char direction, char* keyText,
-                    int keyBits)
+int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char direction, char* keyText, int keyBits)
 {
     if (key == nullptr || cipher == nullptr || keyText == nullptr)
         return 0;
@@ -132,8 +133,8 @@ unsigned char tessaline_crypt::pairValue(const char* pair)
     return static_cast<unsigned char>(std::strtoul(text, nullptr, 16));
 }
 
-int tessaline_crypt::decryptHexText(char* keyText, const char* text, std::size_t textLength,
-                                    unsigned char* out, unsigned long* length)
+int tessaline_crypt::decryptHexText(char* keyText, const char* text, std::size_t textLength, unsigned char* out,
+                                    unsigned long* length)
 {
     const int keyBits = keyBitsOf(keyText);
     if (keyBits == 0)
@@ -157,8 +158,7 @@ int tessaline_crypt::decryptHexText(char* keyText, const char* text, std::size_t
     SecretBuffer record(textLength);
     if (!record)
         return 0;
-    blockDecrypt(&context.cipher, &context.key, cipherText.get(), static_cast<int>(blocks * BLOCK_SIZE),
-                 record.get());
+    blockDecrypt(&context.cipher, &context.key, cipherText.get(), static_cast<int>(blocks * BLOCK_SIZE), record.get());
 
     unsigned long stored = 0;
     unsigned long available = 0;
@@ -196,8 +196,7 @@ int TwoFishEncrypt(char* key, unsigned char* data, unsigned long length, char* o
     CipherContext context;
     if (!TwoFishKeySetup(&context.key, &context.cipher, DIR_ENCRYPT, key, keyBits))
         return 0;
-    blockEncrypt(&context.cipher, &context.key, bytes, static_cast<int>((length + kLengthWordBytes) * 8),
-                 bytes);
+    blockEncrypt(&context.cipher, &context.key, bytes, static_cast<int>((length + kLengthWordBytes) * 8), bytes);
 
     for (std::size_t i = 0; i < recordBytes; ++i) {
         const unsigned char complemented = static_cast<unsigned char>(~bytes[i]);

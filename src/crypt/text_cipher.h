@@ -11,8 +11,7 @@
 // keyBits / 32 groups of 8 hex digits of keyText (at most 8 groups;
 // a group ends early at the text's NUL). Returns 1, or 0 for a null pointer
 // or a refusal of the engine.
-int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char direction,
-                    char* keyText, int keyBits);
+int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char direction, char* keyText, int keyBits);
 
 // Copies the fixed key text and its NUL into `buffer` (33 characters); a
 // null buffer is ignored.
@@ -28,8 +27,7 @@ unsigned char pairValue(const char* pair);
 
 // TwoFishDecrypt on the first textLength characters of `text`, which need
 // not be terminated there.
-int decryptHexText(char* keyText, const char* text, std::size_t textLength, unsigned char* out,
-                   unsigned long* length);
+int decryptHexText(char* keyText, const char* text, std::size_t textLength, unsigned char* out, unsigned long* length);
 
 }  // namespace tessaline_crypt
 

@@ -33,15 +33,13 @@ TESSALINE_ALWAYS_INLINE void storeBigEndian(unsigned char* p, uint32_t word)
 // g of a word, byte j of the input (bits 31-8j downwards) indexing table j.
 TESSALINE_ALWAYS_INLINE uint32_t g(const uint32_t* s, uint32_t x)
 {
-    return s[2 * (x >> 24)] ^ s[2 * ((x >> 16) & 0xFF) + 1] ^ s[512 + 2 * ((x >> 8) & 0xFF)] ^
-           s[513 + 2 * (x & 0xFF)];
+    return s[2 * (x >> 24)] ^ s[2 * ((x >> 16) & 0xFF) + 1] ^ s[512 + 2 * ((x >> 8) & 0xFF)] ^ s[513 + 2 * (x & 0xFF)];
 }
 
 // g of the second round input, whose bytes are taken in the order 3, 0, 1, 2.
 TESSALINE_ALWAYS_INLINE uint32_t gRotated(const uint32_t* s, uint32_t x)
 {
-    return s[2 * (x & 0xFF)] ^ s[2 * (x >> 24) + 1] ^ s[512 + 2 * ((x >> 16) & 0xFF)] ^
-           s[513 + 2 * ((x >> 8) & 0xFF)];
+    return s[2 * (x & 0xFF)] ^ s[2 * (x >> 24) + 1] ^ s[512 + 2 * ((x >> 16) & 0xFF)] ^ s[513 + 2 * ((x >> 8) & 0xFF)];
 }
 
 struct Block {
@@ -152,8 +150,8 @@ TESSALINE_ALWAYS_INLINE void cipherLanes(const uint32_t* s, const uint32_t* k, i
 
 // `Lanes` consecutive blocks in one pass.
 template <Direction D, int Lanes>
-TESSALINE_ALWAYS_INLINE void runLanes(const uint32_t* s, const uint32_t* k, int rounds,
-                                      const unsigned char* in, unsigned char* out)
+TESSALINE_ALWAYS_INLINE void runLanes(const uint32_t* s, const uint32_t* k, int rounds, const unsigned char* in,
+                                      unsigned char* out)
 {
     Block b[Lanes];
     for (int l = 0; l < Lanes; ++l)
@@ -182,17 +180,24 @@ TESSALINE_ALWAYS_INLINE void runCodeBook(const uint32_t* s, const uint32_t* k, i
         out += 3 * kBlockBytes;
     }
     switch (blocks) {
-    case 3: runLanes<D, 3>(s, k, rounds, in, out); break;
-    case 2: runLanes<D, 2>(s, k, rounds, in, out); break;
-    case 1: runLanes<D, 1>(s, k, rounds, in, out); break;
-    default: break;
+    case 3:
+        runLanes<D, 3>(s, k, rounds, in, out);
+        break;
+    case 2:
+        runLanes<D, 2>(s, k, rounds, in, out);
+        break;
+    case 1:
+        runLanes<D, 1>(s, k, rounds, in, out);
+        break;
+    default:
+        break;
     }
 }
 
 // Cipher block chaining on block words, with the chaining value in `chain`.
 template <Direction D>
-void runChained(const uint32_t* s, const uint32_t* k, int rounds, long blocks, uint32_t* chain,
-                const unsigned char* in, unsigned char* out)
+void runChained(const uint32_t* s, const uint32_t* k, int rounds, long blocks, uint32_t* chain, const unsigned char* in,
+                unsigned char* out)
 {
     for (; blocks > 0; --blocks, in += kBlockBytes, out += kBlockBytes) {
         Block b = loadBlock(in);
@@ -215,8 +220,8 @@ void runChained(const uint32_t* s, const uint32_t* k, int rounds, long blocks, u
 // The one-bit feedback loop: each bit is combined with the top bit of the
 // enciphered feedback register, which then shifts left taking in the
 // cipher-text bit.
-int runCfb1(cipherInstance* cipher, keyInstance* key, const unsigned char* input, int inputLen,
-            unsigned char* out, Direction direction)
+int runCfb1(cipherInstance* cipher, keyInstance* key, const unsigned char* input, int inputLen, unsigned char* out,
+            Direction direction)
 {
     cipher->mode = MODE_ECB;
     for (int n = 0; n < inputLen; ++n) {
@@ -238,8 +243,7 @@ int runCfb1(cipherInstance* cipher, keyInstance* key, const unsigned char* input
 }
 
 template <Direction D>
-int process(cipherInstance* cipher, keyInstance* key, const unsigned char* input, int inputLen,
-            unsigned char* out)
+int process(cipherInstance* cipher, keyInstance* key, const unsigned char* input, int inputLen, unsigned char* out)
 {
     if (cipher == nullptr || key == nullptr || (inputLen > 0 && (input == nullptr || out == nullptr)))
         return 0;
@@ -276,14 +280,12 @@ int process(cipherInstance* cipher, keyInstance* key, const unsigned char* input
 
 extern "C" {
 
-int blockEncrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input, int inputLen,
-                 unsigned char* outBuffer)
+int blockEncrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input, int inputLen, unsigned char* outBuffer)
 {
     return process<Direction::kEncrypt>(cipher, key, input, inputLen, outBuffer);
 }
 
-int blockDecrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input, int inputLen,
-                 unsigned char* outBuffer)
+int blockDecrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input, int inputLen, unsigned char* outBuffer)
 {
     return process<Direction::kDecrypt>(cipher, key, input, inputLen, outBuffer);
 }

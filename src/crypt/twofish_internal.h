@@ -13,15 +13,24 @@ constexpr int kRoundSubkeyPairs = 16;
 constexpr int kWhiteningWords = 8;
 constexpr int kMaxRounds = 16;
 
-constexpr int byteShift(int byteIndex) { return 24 - 8 * byteIndex; }
+constexpr int byteShift(int byteIndex)
+{
+    return 24 - 8 * byteIndex;
+}
 
 constexpr uint32_t byteOf(uint32_t word, int byteIndex)
 {
     return (word >> byteShift(byteIndex)) & 0xFF;
 }
 
-constexpr uint32_t rotateLeft(uint32_t x, int n) { return (x << n) | (x >> (32 - n)); }
-constexpr uint32_t rotateRight(uint32_t x, int n) { return (x >> n) | (x << (32 - n)); }
+constexpr uint32_t rotateLeft(uint32_t x, int n)
+{
+    return (x << n) | (x >> (32 - n));
+}
+constexpr uint32_t rotateRight(uint32_t x, int n)
+{
+    return (x >> n) | (x << (32 - n));
+}
 
 // Rounds a key instance runs, held to what subKeys has room for.
 inline int roundsOf(const keyInstance* key)

@@ -120,22 +120,34 @@ int reKey(keyInstance* key)
         oddWords[i] = key->key32[2 * i + 1];
     }
     for (int i = 0; i < pairs; ++i)
-        key->sboxKeys[pairs - 1 - i] =
-            static_cast<uint32_t>(RS_MDS_Encode(evenWords[i], oddWords[i]));
+        key->sboxKeys[pairs - 1 - i] = static_cast<uint32_t>(RS_MDS_Encode(evenWords[i], oddWords[i]));
 
     const int hWords = pairs < 2 ? 2 : pairs;
     const int subkeyPairs = kWhiteningWords / 2 + roundsOf(key);
     switch (hWords) {
-    case 4: fillSubkeys<4>(key, subkeyPairs, evenWords, oddWords); break;
-    case 3: fillSubkeys<3>(key, subkeyPairs, evenWords, oddWords); break;
-    default: fillSubkeys<2>(key, subkeyPairs, evenWords, oddWords); break;
+    case 4:
+        fillSubkeys<4>(key, subkeyPairs, evenWords, oddWords);
+        break;
+    case 3:
+        fillSubkeys<3>(key, subkeyPairs, evenWords, oddWords);
+        break;
+    default:
+        fillSubkeys<2>(key, subkeyPairs, evenWords, oddWords);
+        break;
     }
 
     switch (key->keyLen) {
-    case 128: fillSBoxes<2>(key); break;
-    case 192: fillSBoxes<3>(key); break;
-    case 256: fillSBoxes<4>(key); break;
-    default: break;
+    case 128:
+        fillSBoxes<2>(key);
+        break;
+    case 192:
+        fillSBoxes<3>(key);
+        break;
+    case 256:
+        fillSBoxes<4>(key);
+        break;
+    default:
+        break;
     }
 
     if (key->direction == DIR_ENCRYPT)
@@ -168,8 +180,7 @@ unsigned long RS_MDS_Encode(unsigned long k0, unsigned long k1)
             const uint32_t top = remainder >> 24;
             const uint32_t timesA = ((top << 1) ^ ((top & 0x80) ? kRsPolynomial : 0)) & 0xFF;
             const uint32_t timesAPlusInverse = (top >> 1) ^ ((top & 1) ? (kRsPolynomial >> 1) : 0) ^ timesA;
-            remainder = (remainder << 8) ^ (timesAPlusInverse << 24) ^ (timesA << 16) ^
-                        (timesAPlusInverse << 8) ^ top;
+            remainder = (remainder << 8) ^ (timesAPlusInverse << 24) ^ (timesA << 16) ^ (timesAPlusInverse << 8) ^ top;
         }
     }
     return remainder;
@@ -206,8 +217,7 @@ int TableOp(int op)
         return 1;
     // Counts up to the limit and stays there, so it cannot wrap.
     int seen = tableQueries.load(std::memory_order_relaxed);
-    while (seen < kTableQueryLimit &&
-           !tableQueries.compare_exchange_weak(seen, seen + 1, std::memory_order_relaxed)) {
+    while (seen < kTableQueryLimit && !tableQueries.compare_exchange_weak(seen, seen + 1, std::memory_order_relaxed)) {
     }
     return seen + 1 < kTableQueryLimit ? 0 : 1;
 }

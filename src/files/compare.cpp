@@ -54,7 +54,5 @@ int64_t rvGetFileSize(const char* path)
 int64_t rvGetFileSize64(void* handle)
 {
     struct stat info;
-    return Sys().fstat(tessaline::files::Descriptor(handle), &info) == 0
-               ? static_cast<int64_t>(info.st_size)
-               : -1;
+    return Sys().fstat(tessaline::files::Descriptor(handle), &info) == 0 ? static_cast<int64_t>(info.st_size) : -1;
 }

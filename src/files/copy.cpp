@@ -81,8 +81,7 @@ bool IsRefusedScheme(const char* text)
         return false;
     }
     rvFilename name(text, 0);
-    const int scheme = HashToken(name.Scheme(), tessaline::g_schemeTokens,
-                                 tessaline::kSchemeTokenLast, 0, 1);
+    const int scheme = HashToken(name.Scheme(), tessaline::g_schemeTokens, tessaline::kSchemeTokenLast, 0, 1);
     return scheme == tessaline::kSchemeFtp || scheme == tessaline::kSchemeHttp;
 }
 
@@ -117,11 +116,9 @@ bool LinkDirectory(const char* existing, const End& target)
 int CopyAt(const End& source, const End& target, const CopyOptions& options);
 
 // The wildcard way: every match of `wildcardText` into the directory `target`.
-int CopyMatches(const End& source, const char* wildcardText, const End& target,
-                const CopyOptions& options)
+int CopyMatches(const End& source, const char* wildcardText, const End& target, const CopyOptions& options)
 {
-    if (options.link != 0 &&
-        LinkDirectory(rvFilename(wildcardText, 0).Directory(), target)) {
+    if (options.link != 0 && LinkDirectory(rvFilename(wildcardText, 0).Directory(), target)) {
         return 1;
     }
     if (MakeDirectory(target) == 0) {
@@ -130,15 +127,14 @@ int CopyMatches(const End& source, const char* wildcardText, const End& target,
     // The target is judged once: a directory takes the members under their
     // own names; anything else takes every member in turn, unless it is a
     // link to a directory below the host's path, which is never written into.
-    const DirectoryFd into = tessaline::files::OpenDirectory(
-        target.place, target.below ? Links::kRefuse : Links::kFollow);
+    const DirectoryFd into =
+        tessaline::files::OpenDirectory(target.place, target.below ? Links::kRefuse : Links::kFollow);
     if (!into.IsOpen() && target.below && tessaline::files::IsDirectoryAt(target.place) == 1) {
         return 0;
     }
     const std::string intoText = rvFilename(target.place.text, 0).Directory();
 
-    const Walk walk =
-        tessaline::files::OpenWalk(source.place, wildcardText, Links::kFollow, source.throughLink);
+    const Walk walk = tessaline::files::OpenWalk(source.place, wildcardText, Links::kFollow, source.throughLink);
     if (walk.directory < 0) {
         return 0;
     }
@@ -180,21 +176,18 @@ int CopyOne(const End& source, const End& target, const CopyOptions& options)
     if (tessaline::files::IsDirectoryAt(source.place, sourceInfo) == 1) {
         // Below the host's path the text is not split again: the split asks
         // the file system, which may answer differently by now.
-        const std::string wildcard = source.below
-                                         ? std::string(source.place.text) + "/*"
-                                         : rvFilename(source.place.text, 0).File("*");
+        const std::string wildcard =
+            source.below ? std::string(source.place.text) + "/*" : rvFilename(source.place.text, 0).File("*");
         return CopyMatches(source, wildcard.c_str(), target, options);
     }
     unsigned int overwrite = options.overwrite;
-    if (overwrite == 1 && !target.below &&
-        CreateDir(rvFilename(target.place.text, 0).Directory(), 0) == 0) {
+    if (overwrite == 1 && !target.below && CreateDir(rvFilename(target.place.text, 0).Directory(), 0) == 0) {
         return 0;
     }
     struct stat targetInfo;
     const bool targetExists = StatAt(target.place, &targetInfo) == 0;
     if (overwrite != 1 && targetExists) {
-        if (sourceInfo.st_mtime == targetInfo.st_mtime &&
-            sourceInfo.st_size == targetInfo.st_size) {
+        if (sourceInfo.st_mtime == targetInfo.st_mtime && sourceInfo.st_size == targetInfo.st_size) {
             return 0;
         }
         overwrite = 1;
@@ -203,26 +196,22 @@ int CopyOne(const End& source, const End& target, const CopyOptions& options)
         return 0;
     }
     if (options.link != 0) {
-        return Sys().symlinkat(source.place.text, target.place.directory, target.place.name) == 0
-                   ? 1
-                   : 0;
+        return Sys().symlinkat(source.place.text, target.place.directory, target.place.name) == 0 ? 1 : 0;
     }
     if (targetExists && IsSameFile(sourceInfo, targetInfo)) {
         return 0;
     }
 
-    OwnedHandle from(tessaline::files::CreateFileAt(source.place.directory, source.place.name,
-                                                    O_RDONLY | O_CLOEXEC, 0, kSourceOpenMode));
+    OwnedHandle from(tessaline::files::CreateFileAt(source.place.directory, source.place.name, O_RDONLY | O_CLOEXEC, 0,
+                                                    kSourceOpenMode));
     if (!from.IsOpen()) {
         return 0;
     }
     // Below the host's path a link at the target's name is not written
     // through: it may lead anywhere.
     const int targetAccess = kReadWriteCreate | O_CLOEXEC | (target.below ? O_NOFOLLOW : 0);
-    OwnedHandle to(tessaline::files::CreateFileAt(target.place.directory, target.place.name,
-                                                  targetAccess,
-                                                  overwrite != 0 ? O_TRUNC : O_EXCL,
-                                                  static_cast<int>(options.mode)));
+    OwnedHandle to(tessaline::files::CreateFileAt(target.place.directory, target.place.name, targetAccess,
+                                                  overwrite != 0 ? O_TRUNC : O_EXCL, static_cast<int>(options.mode)));
     if (!to.IsOpen()) {
         return 0;
     }
@@ -248,9 +237,8 @@ int CopyAt(const End& source, const End& target, const CopyOptions& options)
 
 }  // namespace
 
-int rvCopyFile(const char* source, const char* target, unsigned int recurse,
-               unsigned int overwrite, unsigned int link, unsigned int move, const char* /*aux1*/,
-               const char* /*aux2*/, unsigned long mode)
+int rvCopyFile(const char* source, const char* target, unsigned int recurse, unsigned int overwrite, unsigned int link,
+               unsigned int move, const char* /*aux1*/, const char* /*aux2*/, unsigned long mode)
 {
     if (source == nullptr || target == nullptr) {
         return 0;
@@ -258,6 +246,5 @@ int rvCopyFile(const char* source, const char* target, unsigned int recurse,
     const CopyOptions options = {recurse, overwrite, link, move, mode};
     const rvFilename src(source, 0);
     const rvFilename dst(target, 0);
-    return CopyAt(End{Place::Host(src), false, false}, End{Place::Host(dst), false, false},
-                  options);
+    return CopyAt(End{Place::Host(src), false, false}, End{Place::Host(dst), false, false}, options);
 }

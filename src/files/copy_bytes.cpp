@@ -44,8 +44,7 @@ void CopyInKernel(void* from, void* to, int64_t* left)
     const int savedErrno = errno;
     while (*left > 0) {
         const auto chunk = static_cast<size_t>(std::min(*left, kKernelCopyChunk));
-        const ssize_t moved =
-            Sys().copy_file_range(Descriptor(from), nullptr, Descriptor(to), nullptr, chunk, 0);
+        const ssize_t moved = Sys().copy_file_range(Descriptor(from), nullptr, Descriptor(to), nullptr, chunk, 0);
         if (moved < 0 && errno == EINTR) {
             continue;
         }
@@ -68,8 +67,7 @@ bool CopyBytes(void* from, void* to)
     CopyInKernel(from, to, &left);
     char buffer[kCopyBufferSize];
     while (left != 0) {
-        const unsigned long want =
-            static_cast<unsigned long>(std::min<int64_t>(left, kCopyBufferSize));
+        const unsigned long want = static_cast<unsigned long>(std::min<int64_t>(left, kCopyBufferSize));
         unsigned long got = 0;
         if (ReadFile(from, buffer, want, &got, nullptr) == 0 || got == 0) {
             return false;

@@ -96,8 +96,7 @@ int rvDirIterator_rep::get_next()
 
 rvDirIterator::rvDirIterator() : m_rep(nullptr), m_name(nullptr) {}
 
-rvDirIterator::rvDirIterator(const char* path)
-    : m_rep(new rvDirIterator_rep(path)), m_name(nullptr)
+rvDirIterator::rvDirIterator(const char* path) : m_rep(new rvDirIterator_rep(path)), m_name(nullptr)
 {
     if (m_rep->get_next() != 0) {
         m_name = m_rep->m_entry->d_name;
@@ -106,8 +105,7 @@ rvDirIterator::rvDirIterator(const char* path)
     }
 }
 
-rvDirIterator::rvDirIterator(const rvDirIterator& other)
-    : m_rep(other.m_rep), m_name(other.m_name)
+rvDirIterator::rvDirIterator(const rvDirIterator& other) : m_rep(other.m_rep), m_name(other.m_name)
 {
     if (m_rep != nullptr) {
         ++m_rep->m_refs;
@@ -121,7 +119,8 @@ rvDirIterator::~rvDirIterator()
 
 // Taking the new reference before letting go of the old one makes
 // self-assignment safe.
-rvDirIterator& rvDirIterator::operator=(const rvDirIterator& other)  // NOLINT(bugprone-unhandled-self-assignment,cert-oop54-cpp)
+// NOLINTNEXTLINE(bugprone-unhandled-self-assignment,cert-oop54-cpp)
+rvDirIterator& rvDirIterator::operator=(const rvDirIterator& other)
 {
     rvDirIterator_rep* rep = other.m_rep;
     const char* name = other.m_name;

@@ -85,14 +85,13 @@ namespace tessaline::files {
 void* CreateFileAt(int directory, const char* name, int access, int disposition, int mode)
 {
     const int flags = access | disposition | kLargeFileFlag;
-    return OpenWithAttempts(
-        [&] { return Sys().openat(directory, name, flags, static_cast<mode_t>(mode)); });
+    return OpenWithAttempts([&] { return Sys().openat(directory, name, flags, static_cast<mode_t>(mode)); });
 }
 
 }  // namespace tessaline::files
 
-void* CreateFile(const char* path, int access, int /*share*/, void* /*security*/,
-                 int disposition, int mode, void* /*templateFile*/)
+void* CreateFile(const char* path, int access, int /*share*/, void* /*security*/, int disposition, int mode,
+                 void* /*templateFile*/)
 {
     const int flags = access | disposition | kLargeFileFlag;
     return OpenWithAttempts([&] { return Sys().open(path, flags, static_cast<mode_t>(mode)); });
@@ -103,18 +102,14 @@ int CloseHandle(void* handle)
     return Sys().close(Descriptor(handle)) == 0 ? 1 : 0;
 }
 
-int ReadFile(void* handle, void* buffer, unsigned long count, unsigned long* done,
-             void* /*overlapped*/)
+int ReadFile(void* handle, void* buffer, unsigned long count, unsigned long* done, void* /*overlapped*/)
 {
-    return TransferRetryingInterrupts(
-        done, [&] { return Sys().read(Descriptor(handle), buffer, count); });
+    return TransferRetryingInterrupts(done, [&] { return Sys().read(Descriptor(handle), buffer, count); });
 }
 
-int WriteFile(void* handle, const void* buffer, unsigned long count, unsigned long* done,
-              void* /*overlapped*/)
+int WriteFile(void* handle, const void* buffer, unsigned long count, unsigned long* done, void* /*overlapped*/)
 {
-    return TransferRetryingInterrupts(
-        done, [&] { return Sys().write(Descriptor(handle), buffer, count); });
+    return TransferRetryingInterrupts(done, [&] { return Sys().write(Descriptor(handle), buffer, count); });
 }
 
 int64_t GetFileSize64(void* handle)
@@ -157,8 +152,7 @@ int GetLastError()
 
 char* GetLastErrorText(char* buffer, unsigned long size, unsigned long error)
 {
-    const int code = (error & kLowHalf) == kLastErrorSelector ? GetLastError()
-                                                              : static_cast<int>(error);
+    const int code = (error & kLowHalf) == kLastErrorSelector ? GetLastError() : static_cast<int>(error);
     const char* text = std::strerror(code);
     if (text == nullptr) {
         text = "undefined.";

@@ -13,7 +13,10 @@ namespace {
 using tessaline::files::kMaxTranslateLength;
 using tessaline::files::kPathWorkArea;
 
-bool IsSlash(char c) { return c == '/' || c == '\\'; }
+bool IsSlash(char c)
+{
+    return c == '/' || c == '\\';
+}
 
 char* Translate(char* text, char from, char to)
 {
@@ -36,7 +39,10 @@ rvFilename::rope& Translate(rvFilename::rope& path, char from, char to)
     return path;
 }
 
-int DirectoryBit(const struct stat& info) { return (info.st_mode & 040000) ? 1 : 0; }
+int DirectoryBit(const struct stat& info)
+{
+    return (info.st_mode & 040000) ? 1 : 0;
+}
 
 }  // namespace
 
@@ -45,7 +51,10 @@ char* rvFilename::XlatPathToUNIX(char* path)
     return path ? Translate(path, '\\', '/') : path;
 }
 
-char* rvFilename::NormalizePath(char* path) { return XlatPathToUNIX(path); }
+char* rvFilename::NormalizePath(char* path)
+{
+    return XlatPathToUNIX(path);
+}
 
 char* rvFilename::XlatPathToDOS(char* path)
 {
@@ -61,11 +70,20 @@ char* rvFilename::XlatPathToDOS(char* path)
     return path;
 }
 
-rvFilename::rope& rvFilename::XlatPathToUNIX(rope& path) { return Translate(path, '\\', '/'); }
+rvFilename::rope& rvFilename::XlatPathToUNIX(rope& path)
+{
+    return Translate(path, '\\', '/');
+}
 
-rvFilename::rope& rvFilename::NormalizePath(rope& path) { return XlatPathToUNIX(path); }
+rvFilename::rope& rvFilename::NormalizePath(rope& path)
+{
+    return XlatPathToUNIX(path);
+}
 
-rvFilename::rope& rvFilename::XlatPathToDOS(rope& path) { return Translate(path, '/', '\\'); }
+rvFilename::rope& rvFilename::XlatPathToDOS(rope& path)
+{
+    return Translate(path, '/', '\\');
+}
 
 int rvFilename::IsDirectory(const char* path)
 {

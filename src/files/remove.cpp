@@ -40,8 +40,7 @@ int RemoveAt(const Place& place, unsigned int recurse);
 // lists, named as rvFilename joins it to `directoryText`. A member whose
 // joined text leads out of the directory is left alone.
 template <typename Remove>
-void ForEachMember(int directory, const std::string& directoryText, const char* pattern,
-                   Remove remove)
+void ForEachMember(int directory, const std::string& directoryText, const char* pattern, Remove remove)
 {
     tessaline::files::ForEachEntry(directory, pattern, [&](const char* entry) {
         const std::string text = tessaline::files::MemberText(directoryText.c_str(), entry);
@@ -57,13 +56,12 @@ int RemoveMatches(const Place& entry, unsigned int recurse)
     const Walk walk = tessaline::files::OpenWalk(entry, entry.text, Links::kRefuse, false);
     int total = 0;
     if (walk.directory >= 0) {
-        ForEachMember(walk.directory, walk.memberDirectory, walk.pattern.c_str(),
-                      [&](const Place& member) {
-                          if (recurse == 0 && tessaline::files::IsDirectoryAt(member) == 1) {
-                              return;
-                          }
-                          total += RemoveAt(member, recurse);
-                      });
+        ForEachMember(walk.directory, walk.memberDirectory, walk.pattern.c_str(), [&](const Place& member) {
+            if (recurse == 0 && tessaline::files::IsDirectoryAt(member) == 1) {
+                return;
+            }
+            total += RemoveAt(member, recurse);
+        });
     }
     return total;
 }
@@ -76,8 +74,7 @@ int RemoveTree(const Place& place)
     if (Sys().unlinkat(place.directory, place.name, 0) != 0) {
         const DirectoryFd directory = tessaline::files::OpenDirectory(place, Links::kRefuse);
         if (directory.IsOpen()) {
-            ForEachMember(directory.Get(), place.text, "*",
-                          [&](const Place& member) { total += RemoveAt(member, 1); });
+            ForEachMember(directory.Get(), place.text, "*", [&](const Place& member) { total += RemoveAt(member, 1); });
         }
     }
     if (Sys().unlinkat(place.directory, place.name, AT_REMOVEDIR) != 0 && errno == ENOTDIR) {
@@ -94,8 +91,7 @@ int RemoveFile(const Place& place)
     }
     if (Sys().unlinkat(place.directory, place.name, 0) != 0) {
         const int error = errno;
-        std::fprintf(stderr, "rvUnlink: Could not remove %s: %s (%d).\n", place.text,
-                     std::strerror(error), error);
+        std::fprintf(stderr, "rvUnlink: Could not remove %s: %s (%d).\n", place.text, std::strerror(error), error);
         return 0;
     }
     return 1;

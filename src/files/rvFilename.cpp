@@ -15,17 +15,23 @@ namespace {
 using tessaline::files::kMaxSplitLength;
 using tessaline::files::kPathWorkArea;
 
-size_t BlockSize(size_t length) { return (length + 4) & ~size_t{3}; }
+size_t BlockSize(size_t length)
+{
+    return (length + 4) & ~size_t{3};
+}
 
 // A zero-filled block with room for `length` characters and the NUL.
-char* NewText(size_t length) { return new char[BlockSize(length)](); }
+char* NewText(size_t length)
+{
+    return new char[BlockSize(length)]();
+}
 
 // Replaces *field by a copy of exactly `length` characters at `begin`.
 void StoreCut(char** field, const char* begin, size_t length)
 {
     char* copy = NewText(length);
     memcpy(copy, begin, length);
-    delete[] *field;
+    delete[] * field;
     *field = copy;
 }
 
@@ -37,9 +43,15 @@ void BackslashesToSlashes(char* text)
     }
 }
 
-bool HasText(const char* text) { return text && *text; }
+bool HasText(const char* text)
+{
+    return text && *text;
+}
 
-size_t LengthOf(const char* text) { return text ? strlen(text) : 0; }
+size_t LengthOf(const char* text)
+{
+    return text ? strlen(text) : 0;
+}
 
 bool IsRemoteScheme(const char* scheme)
 {
@@ -67,11 +79,9 @@ private:
 
 // The text that Join forms from its parts, before it is split again; the
 // caller owns it.
-char* JoinParts(const char* scheme, const char* server, const char* directory, const char* file,
-                const char* ext)
+char* JoinParts(const char* scheme, const char* server, const char* directory, const char* file, const char* ext)
 {
-    TextBuilder text(16 + LengthOf(scheme) + LengthOf(server) + LengthOf(directory) +
-                     LengthOf(file) + LengthOf(ext));
+    TextBuilder text(16 + LengthOf(scheme) + LengthOf(server) + LengthOf(directory) + LengthOf(file) + LengthOf(ext));
     if (HasText(scheme)) {
         text.Append(scheme);
         if (!text.Holds("://"))
@@ -99,8 +109,8 @@ char* JoinParts(const char* scheme, const char* server, const char* directory, c
 
 // The first occurrence in `path` of the text that the given components join
 // to, running to the end of `path`; "" when there is none.
-const char* FindJoined(const char* path, const char* scheme, const char* server,
-                       const char* directory, const char* file, const char* ext)
+const char* FindJoined(const char* path, const char* scheme, const char* server, const char* directory,
+                       const char* file, const char* ext)
 {
     if (!path)
         return rvFilename::m_pNullStr;
@@ -166,7 +176,7 @@ rvFilename::~rvFilename()
 void rvFilename::Clear()
 {
     for (char** field : {&m_pScheme, &m_pServer, &m_pFullDirectory, &m_pDirectory, &m_pFile, &m_pExt}) {
-        delete[] *field;
+        delete[] * field;
         *field = nullptr;
     }
 }
@@ -185,7 +195,7 @@ char* rvFilename::Dup(const char* text, int length)
 char* rvFilename::Dup(char** field, const char* text, int length)
 {
     char* copy = Dup(text, length);
-    delete[] *field;
+    delete[] * field;
     *field = copy;
     return copy;
 }
@@ -255,8 +265,8 @@ void rvFilename::Split(const char* text)
     NormalizePath(m_pPath);
 }
 
-const char* rvFilename::Join(const char* scheme, const char* server, const char* directory,
-                             const char* file, const char* ext)
+const char* rvFilename::Join(const char* scheme, const char* server, const char* directory, const char* file,
+                             const char* ext)
 {
     if (!scheme && !server && !directory && !file && !ext) {
         if (!m_pScheme && !m_pServer && !m_pDirectory && !m_pFile && !m_pExt)
@@ -289,14 +299,35 @@ const char* rvFilename::Filename()
     return FindJoined(m_pPath, nullptr, nullptr, nullptr, File(), Ext());
 }
 
-const char* rvFilename::LocalPath() { return Pathname(); }
+const char* rvFilename::LocalPath()
+{
+    return Pathname();
+}
 
-const char* rvFilename::Scheme() { return m_pScheme ? m_pScheme : m_pNullStr; }
-const char* rvFilename::Server() { return m_pServer ? m_pServer : m_pNullStr; }
-const char* rvFilename::FullDirectory() { return m_pFullDirectory ? m_pFullDirectory : m_pNullStr; }
-const char* rvFilename::Directory() { return m_pDirectory ? m_pDirectory : m_pNullStr; }
-const char* rvFilename::File() { return m_pFile ? m_pFile : m_pNullStr; }
-const char* rvFilename::Ext() { return m_pExt ? m_pExt : m_pNullStr; }
+const char* rvFilename::Scheme()
+{
+    return m_pScheme ? m_pScheme : m_pNullStr;
+}
+const char* rvFilename::Server()
+{
+    return m_pServer ? m_pServer : m_pNullStr;
+}
+const char* rvFilename::FullDirectory()
+{
+    return m_pFullDirectory ? m_pFullDirectory : m_pNullStr;
+}
+const char* rvFilename::Directory()
+{
+    return m_pDirectory ? m_pDirectory : m_pNullStr;
+}
+const char* rvFilename::File()
+{
+    return m_pFile ? m_pFile : m_pNullStr;
+}
+const char* rvFilename::Ext()
+{
+    return m_pExt ? m_pExt : m_pNullStr;
+}
 
 const char* rvFilename::Scheme(const char* text)
 {
@@ -328,9 +359,15 @@ const char* rvFilename::Ext(const char* text)
     return Join(nullptr, nullptr, nullptr, nullptr, nullptr);
 }
 
-int rvFilename::IsDirectory() { return m_pPath ? IsDirectory(m_pPath) : 0; }
+int rvFilename::IsDirectory()
+{
+    return m_pPath ? IsDirectory(m_pPath) : 0;
+}
 
-int rvFilename::IsURL() { return m_pScheme && m_pServer ? 1 : 0; }
+int rvFilename::IsURL()
+{
+    return m_pScheme && m_pServer ? 1 : 0;
+}
 
 int rvFilename::Empty(const char* text)
 {
@@ -339,11 +376,20 @@ int rvFilename::Empty(const char* text)
     return HasText(text) ? 0 : 1;
 }
 
-int rvFilename::Exists(int mode) { return m_pPath ? Exists(m_pPath, mode) : 0; }
+int rvFilename::Exists(int mode)
+{
+    return m_pPath ? Exists(m_pPath, mode) : 0;
+}
 
-const char* rvFilename::operator()() const { return m_pPath ? m_pPath : m_pNullStr; }
+const char* rvFilename::operator()() const
+{
+    return m_pPath ? m_pPath : m_pNullStr;
+}
 
-rvFilename::operator const char*() const { return m_pPath ? m_pPath : m_pNullStr; }
+rvFilename::operator const char*() const
+{
+    return m_pPath ? m_pPath : m_pNullStr;
+}
 
 int rvFilename::operator==(const rvFilename& other) const
 {
@@ -366,8 +412,7 @@ namespace tessaline::files {
 std::string MemberText(const char* directory, const char* entry)
 {
     rvFilename item(entry, 0);
-    const std::unique_ptr<char[]> joined(
-        JoinParts(item.Scheme(), item.Server(), directory, item.File(), item.Ext()));
+    const std::unique_ptr<char[]> joined(JoinParts(item.Scheme(), item.Server(), directory, item.File(), item.Ext()));
     rvFilename::NormalizePath(joined.get());
     return joined.get();
 }

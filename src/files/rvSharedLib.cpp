@@ -18,7 +18,10 @@ rvSharedLib::rvSharedLib(const char* name, int flags)
         m_name = name;
 }
 
-rvSharedLib::~rvSharedLib() { rvSharedLib::Close(); }
+rvSharedLib::~rvSharedLib()
+{
+    rvSharedLib::Close();
+}
 
 rvSharedLib& rvSharedLib::operator=(const rvSharedLib& other)
 {
@@ -61,7 +64,10 @@ int rvSharedLib::Close()
     return result == 0 ? 1 : 0;
 }
 
-void* rvSharedLib::ProcAddr(const char* symbol) { return ResolveSymbol(symbol); }
+void* rvSharedLib::ProcAddr(const char* symbol)
+{
+    return ResolveSymbol(symbol);
+}
 
 void* rvSharedLib::ResolveSymbol(const char* symbol)
 {
@@ -76,13 +82,25 @@ void* rvSharedLib::ResolveSymbol(const char* symbol)
     return address;
 }
 
-int rvSharedLib::IsValid() { return m_handle ? 1 : 0; }
+int rvSharedLib::IsValid()
+{
+    return m_handle ? 1 : 0;
+}
 
-int rvSharedLib::Disposition() { return m_disposition; }
+int rvSharedLib::Disposition()
+{
+    return m_disposition;
+}
 
-void rvSharedLib::Disposition(int disposition) { m_disposition = disposition; }
+void rvSharedLib::Disposition(int disposition)
+{
+    m_disposition = disposition;
+}
 
-rvSharedLib::operator const char*() { return m_name(); }
+rvSharedLib::operator const char*()
+{
+    return m_name();
+}
 
 char* rvSharedLib::DefaultExtension(const char* extension)
 {
@@ -92,4 +110,7 @@ char* rvSharedLib::DefaultExtension(const char* extension)
     return m_defLibExt;
 }
 
-char* rvSharedLib::DefaultExtension() { return m_defLibExt; }
+char* rvSharedLib::DefaultExtension()
+{
+    return m_defLibExt;
+}

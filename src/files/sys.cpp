@@ -41,10 +41,10 @@ int StatFileSystem(const char* path, struct statfs* info)
 }
 
 SysCalls g_sys = {
-    OpenFile, ::close, ::read, ::write, ::copy_file_range, ::lseek, StatHandle, StatPath, ::lockf,
-    ::access, ::chmod, ::mkdir, ::unlink, ::rmdir, ::symlink, ::realpath, StatFileSystem,
-    ::nanosleep, ::opendir, ::readdir, ::closedir, ::pathconf,
-    OpenFileAt, StatAt, ::faccessat, ::unlinkat, ::mkdirat, ::fchmodat, ::symlinkat, ::fdopendir,
+    OpenFile,       ::close,     ::read,    ::write,    ::copy_file_range, ::lseek,     StatHandle, StatPath,
+    ::lockf,        ::access,    ::chmod,   ::mkdir,    ::unlink,          ::rmdir,     ::symlink,  ::realpath,
+    StatFileSystem, ::nanosleep, ::opendir, ::readdir,  ::closedir,        ::pathconf,  OpenFileAt, StatAt,
+    ::faccessat,    ::unlinkat,  ::mkdirat, ::fchmodat, ::symlinkat,       ::fdopendir,
 };
 
 }  // namespace
@@ -56,21 +56,45 @@ SysCalls& Sys()
 
 namespace sys {
 
-int Stat(const char* path, struct stat* info) { return Sys().stat(path, info); }
+int Stat(const char* path, struct stat* info)
+{
+    return Sys().stat(path, info);
+}
 
-int Access(const char* path, int mode) { return Sys().access(path, mode); }
+int Access(const char* path, int mode)
+{
+    return Sys().access(path, mode);
+}
 
-int MakeDirectory(const char* path, mode_t mode) { return Sys().mkdir(path, mode); }
+int MakeDirectory(const char* path, mode_t mode)
+{
+    return Sys().mkdir(path, mode);
+}
 
-char* ResolvePath(const char* path, char* resolved) { return Sys().realpath(path, resolved); }
+char* ResolvePath(const char* path, char* resolved)
+{
+    return Sys().realpath(path, resolved);
+}
 
-int FileSystemStatus(const char* path, struct statfs* info) { return Sys().statfs(path, info); }
+int FileSystemStatus(const char* path, struct statfs* info)
+{
+    return Sys().statfs(path, info);
+}
 
-void* OpenLibrary(const char* name, int mode) { return ::dlopen(name, mode); }
+void* OpenLibrary(const char* name, int mode)
+{
+    return ::dlopen(name, mode);
+}
 
-int CloseLibrary(void* handle) { return ::dlclose(handle); }
+int CloseLibrary(void* handle)
+{
+    return ::dlclose(handle);
+}
 
-void* LibrarySymbol(void* handle, const char* symbol) { return ::dlsym(handle, symbol); }
+void* LibrarySymbol(void* handle, const char* symbol)
+{
+    return ::dlsym(handle, symbol);
+}
 
 void DiscardLibraryError()
 {

@@ -14,7 +14,6 @@
 #include <sys/vfs.h>
 #include <time.h>
 
-
 namespace tessaline::files {
 
 struct SysCalls {
@@ -23,8 +22,8 @@ struct SysCalls {
     ssize_t (*read)(int fd, void* buffer, size_t count);
     ssize_t (*write)(int fd, const void* buffer, size_t count);
     // Kernel-side copy between the current offsets of two descriptors.
-    ssize_t (*copy_file_range)(int from, loff_t* fromOffset, int to, loff_t* toOffset,
-                               size_t count, unsigned int flags);
+    ssize_t (*copy_file_range)(int from, loff_t* fromOffset, int to, loff_t* toOffset, size_t count,
+                               unsigned int flags);
     off_t (*lseek)(int fd, off_t offset, int whence);
     int (*fstat)(int fd, struct stat* info);
     int (*stat)(const char* path, struct stat* info);

@@ -53,8 +53,7 @@ DirectoryFd& DirectoryFd::operator=(DirectoryFd&& other) noexcept
 
 DirectoryFd OpenDirectory(const Place& place, Links links)
 {
-    const int flags =
-        O_RDONLY | O_DIRECTORY | O_CLOEXEC | (links == Links::kRefuse ? O_NOFOLLOW : 0);
+    const int flags = O_RDONLY | O_DIRECTORY | O_CLOEXEC | (links == Links::kRefuse ? O_NOFOLLOW : 0);
     return DirectoryFd(Sys().openat(place.directory, place.name, flags, 0));
 }
 
@@ -64,8 +63,7 @@ int IsDirectoryAt(const Place& place)
         return rvFilename::IsDirectory(place.text);
     }
     struct stat info;
-    return Sys().fstatat(place.directory, place.name, &info, 0) == 0 ? IsDirectoryAt(place, info)
-                                                                      : 0;
+    return Sys().fstatat(place.directory, place.name, &info, 0) == 0 ? IsDirectoryAt(place, info) : 0;
 }
 
 int IsDirectoryAt(const Place& place, const struct stat& info)
@@ -79,8 +77,7 @@ int IsDirectoryAt(const Place& place, const struct stat& info)
 bool IsLinkAt(const Place& place)
 {
     struct stat info;
-    return Sys().fstatat(place.directory, place.name, &info, AT_SYMLINK_NOFOLLOW) == 0 &&
-           S_ISLNK(info.st_mode);
+    return Sys().fstatat(place.directory, place.name, &info, AT_SYMLINK_NOFOLLOW) == 0 && S_ISLNK(info.st_mode);
 }
 
 bool NameInside(const char* directoryText, const char* memberText, std::string* name)
@@ -168,8 +165,7 @@ Walk OpenWalk(const Place& entry, const char* wildcardText, Links links, bool th
     return walk;
 }
 
-void ForEachEntry(int directory, const char* pattern,
-                  const std::function<void(const char* name)>& visit)
+void ForEachEntry(int directory, const char* pattern, const std::function<void(const char* name)>& visit)
 {
     // A descriptor of its own, so the listing keeps its position while the
     // caller works in the same directory.

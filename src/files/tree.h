@@ -83,11 +83,11 @@ void SplitWalk(const char* path, rvFilename* directory, rvFilename* pattern);
 // The walk of a wildcard text: the open directory its members live in, the
 // text they are joined to, and the pattern they must match.
 struct Walk {
-    DirectoryFd owned;             // the directory, when the walk opened one
-    int directory = -1;            // -1: nothing to walk
-    std::string memberDirectory;   // what rvFilename joins member names to
+    DirectoryFd owned;            // the directory, when the walk opened one
+    int directory = -1;           // -1: nothing to walk
+    std::string memberDirectory;  // what rvFilename joins member names to
     std::string pattern;
-    bool throughLink = false;      // the directory was reached through a link
+    bool throughLink = false;  // the directory was reached through a link
 };
 
 // Opens the walk of `wildcardText` at `entry`: for the host's own text the
@@ -102,8 +102,7 @@ Walk OpenWalk(const Place& entry, const char* wildcardText, Links links, bool th
 // `pattern` (fnmatch with FNM_PATHNAME), in the order the platform lists
 // them; "." and ".." are left out. Entries removed or added meanwhile give
 // what the platform delivers.
-void ForEachEntry(int directory, const char* pattern,
-                  const std::function<void(const char* name)>& visit);
+void ForEachEntry(int directory, const char* pattern, const std::function<void(const char* name)>& visit);
 
 }  // namespace tessaline::files
 

@@ -70,8 +70,7 @@ int lockRecursive(MMutex& mutex, int* err, bool blocking)
         tessaline::storeRelaxed(mutex.m_count, loadRelaxed(mutex.m_count) + 1);
         return 0;
     }
-    const int result =
-        blocking ? pthread_mutex_lock(&mutex.m_mutex) : pthread_mutex_trylock(&mutex.m_mutex);
+    const int result = blocking ? pthread_mutex_lock(&mutex.m_mutex) : pthread_mutex_trylock(&mutex.m_mutex);
     if (result == 0) {
         setRecord(mutex, self, 1, 1);
     }
@@ -113,7 +112,7 @@ int lockChecked(MMutex& mutex, int* err, bool blocking)
 int lockTracked(MMutex& mutex, int* err, bool blocking)
 {
     return mutex.m_type == MMutex_::MutexRecursive ? lockRecursive(mutex, err, blocking)
-                                                    : lockChecked(mutex, err, blocking);
+                                                   : lockChecked(mutex, err, blocking);
 }
 
 }  // namespace
@@ -123,8 +122,7 @@ namespace tessaline {
 MutexRecord readRecord(MMutex& mutex)
 {
     GuardLock guard(mutex.m_guard);
-    return MutexRecord{loadRelaxed(mutex.m_owner), loadRelaxed(mutex.m_count),
-                       loadRelaxed(mutex.m_held)};
+    return MutexRecord{loadRelaxed(mutex.m_owner), loadRelaxed(mutex.m_count), loadRelaxed(mutex.m_held)};
 }
 
 void writeRecord(MMutex& mutex, const MutexRecord& record)

@@ -70,7 +70,8 @@ int MThread::Kill(int* err)
 {
     // Kill's documented effect on the caller; the library's own locked spans
     // hold cancellation off, so they stay safe under it.
-    pthread_setcanceltype(PTHREAD_CANCEL_ASYNCHRONOUS, nullptr);  // NOLINT(cert-pos47-c,concurrency-thread-canceltype-asynchronous)
+    // NOLINTNEXTLINE(cert-pos47-c,concurrency-thread-canceltype-asynchronous)
+    pthread_setcanceltype(PTHREAD_CANCEL_ASYNCHRONOUS, nullptr);
     pthread_setcancelstate(PTHREAD_CANCEL_ENABLE, nullptr);
     const int result = tessaline::requestCancel(*this);
     StoreLastError(result);

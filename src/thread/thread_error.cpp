@@ -15,8 +15,7 @@ int CHECK_SYSERROR(int err)
     }
     // The line keeps its classic %d form; on LP64 that shows the low 32 bits
     // of the thread identifier.
-    std::fprintf(stderr, "Thread #%d error: %s (%d)\n",
-                 static_cast<int>(pthread_self()), std::strerror(err), err);
+    std::fprintf(stderr, "Thread #%d error: %s (%d)\n", static_cast<int>(pthread_self()), std::strerror(err), err);
     return -1;
 }
 

@@ -20,8 +20,7 @@ int exactSearch(const char* token, const _tokenHash* first, const _tokenHash* la
 int looseSearch(const char* token, _tokenHash* first, _tokenHash* end)
 {
     const _tokenHash::LooseFindPred isPrefix;
-    _tokenHash* const start =
-        std::find_if(first, end, [&](const _tokenHash& row) { return isPrefix(row, token); });
+    _tokenHash* const start = std::find_if(first, end, [&](const _tokenHash& row) { return isPrefix(row, token); });
     if (start == end) {
         return -1;
     }

@@ -57,8 +57,7 @@ Accumulator accumulateDigits(const char* s)
         if (*s < '0' || *s > '9') {
             continue;
         }
-        const std::uint64_t wide =
-            static_cast<std::uint64_t>(value) * 10 + static_cast<std::uint64_t>(*s - '0');
+        const std::uint64_t wide = static_cast<std::uint64_t>(value) * 10 + static_cast<std::uint64_t>(*s - '0');
         const Accumulator next = static_cast<Accumulator>(wide);
         if (next < value) {
             break;

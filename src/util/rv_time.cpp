@@ -33,8 +33,7 @@ char* formatInto(const tm* fields, const char* format, char* out, int size)
     if (out == nullptr || size < 1) {
         return out;
     }
-    if (fields == nullptr || format == nullptr ||
-        strftime(out, static_cast<size_t>(size), format, fields) == 0) {
+    if (fields == nullptr || format == nullptr || strftime(out, static_cast<size_t>(size), format, fields) == 0) {
         out[0] = '\0';
     }
     return out;
@@ -61,12 +60,12 @@ rvTime::rvTime(int year, int month, int day, int hour, int minute, int second, i
 }
 
 rvTime::rvTime(unsigned short dosDate, unsigned short dosTime, int isDst)
-    : m_time(fromFields(1980 + ((dosDate >> 9) & 0x7f), (dosDate >> 5) & 0x0f, dosDate & 0x1f,
-                        (dosTime >> 11) & 0x1f, (dosTime >> 5) & 0x3f, 2 * (dosTime & 0x1f), isDst))
+    : m_time(fromFields(1980 + ((dosDate >> 9) & 0x7f), (dosDate >> 5) & 0x0f, dosDate & 0x1f, (dosTime >> 11) & 0x1f,
+                        (dosTime >> 5) & 0x3f, 2 * (dosTime & 0x1f), isDst))
 {
 }
 
-rvTime (rvTime::GetCurrentTime)()
+rvTime(rvTime::GetCurrentTime)()
 {
     return rvTime(time(nullptr), true);
 }

@@ -18,8 +18,7 @@ std::atomic<std::uint64_t> g_startTicks{0};
 
 std::uint64_t ticksOf(const timeval& tv)
 {
-    return static_cast<std::uint64_t>(tv.tv_sec) * kTicksPerSecond +
-           static_cast<std::uint64_t>(tv.tv_usec);
+    return static_cast<std::uint64_t>(tv.tv_sec) * kTicksPerSecond + static_cast<std::uint64_t>(tv.tv_usec);
 }
 
 }  // namespace

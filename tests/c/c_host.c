@@ -82,15 +82,18 @@ static void encryption(void)
 
     memset(&key, 0, sizeof key);
     check(makeKey(&key, DIR_ENCRYPT, 128, NULL) == TRUE && reKey(&key) == TRUE &&
-              cipherInit(&cipher, MODE_ECB, NULL) == TRUE, "keying");
+              cipherInit(&cipher, MODE_ECB, NULL) == TRUE,
+          "keying");
     check(blockEncrypt(&cipher, &key, block, BLOCK_SIZE, block) == BLOCK_SIZE &&
-              memcmp(block, kZeroKeyZeroBlock, sizeof block) == 0, "blockEncrypt");
+              memcmp(block, kZeroKeyZeroBlock, sizeof block) == 0,
+          "blockEncrypt");
     check(blockDecrypt(&cipher, &key, block, BLOCK_SIZE, block) == BLOCK_SIZE && block[0] == 0 &&
-              memcmp(block, block + 1, sizeof block - 1) == 0, "blockDecrypt");
+              memcmp(block, block + 1, sizeof block - 1) == 0,
+          "blockDecrypt");
 
     check(RVUI_Encrypt(data, 6, text) == 1 && strlen(text) == 36, "RVUI_Encrypt");
-    check(RVUI_Decrypt(text, out, &length, &wasPlain) == 1 && length == 6 && wasPlain == 0 &&
-              memcmp(out, data, 6) == 0, "RVUI_Decrypt");
+    check(RVUI_Decrypt(text, out, &length, &wasPlain) == 1 && length == 6 && wasPlain == 0 && memcmp(out, data, 6) == 0,
+          "RVUI_Decrypt");
 }
 
 static void handleCalls(const char* root)

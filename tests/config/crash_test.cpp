@@ -55,8 +55,7 @@ std::string initialFile()
 std::string body(const std::string& text)
 {
     const std::string::size_type last = text.rfind("# Edited by Tessaline: ");
-    if (text.empty() || text.back() != '\n' || last == std::string::npos ||
-        text.find('\n', last) != text.size() - 1) {
+    if (text.empty() || text.back() != '\n' || last == std::string::npos || text.find('\n', last) != text.size() - 1) {
         return "";
     }
     return text.substr(0, last);

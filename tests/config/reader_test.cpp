@@ -148,8 +148,7 @@ TEST(RvConfigReader, KeyNamesKeepTheirSpellingInEverySection)
              key = config.EnumTokens(name.c_str(), 0)) {
             keys += std::string(key) + ",";
         }
-        EXPECT_NE(keys.find(std::string(spellings[section % 3]) + ","), std::string::npos)
-            << name << ": " << keys;
+        EXPECT_NE(keys.find(std::string(spellings[section % 3]) + ","), std::string::npos) << name << ": " << keys;
         for (int key = 0; key < 40; ++key) {
             const std::string own = "k" + std::to_string(section * 7 + key) + ",";
             EXPECT_NE(keys.find(own), std::string::npos) << name << " lacks " << own;
@@ -279,8 +278,7 @@ TEST(RvConfigReader, FailedLoadKeepsEverything)
     config.PutValue("mine", "1", "s");
     config.Mode(rvConfig::OpenUpdate);
     config.ConfigName("before.ini");
-    tessaline::config::testing::SetFaultHook(
-        [](tessaline::config::testing::SysCall, const char*) { return EACCES; });
+    tessaline::config::testing::SetFaultHook([](tessaline::config::testing::SysCall, const char*) { return EACCES; });
     const auto start = std::chrono::steady_clock::now();
     EXPECT_EQ(config.Load(path.c_str(), rvConfig::OpenRead), 0u);
     const auto waited = std::chrono::steady_clock::now() - start;

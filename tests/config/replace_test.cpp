@@ -71,8 +71,8 @@ public:
             m_applied = access(dir.Path("").c_str(), W_OK) != 0 || setImmutable(true);
             break;
         case RealFault::BackupIsDirectory:
-            m_applied = mkdir(dir.Path("app.bak").c_str(), 0755) == 0 &&
-                        !dir.Write("app.bak/occupied", "x").empty() && dir.Exists("app.bak/occupied");
+            m_applied = mkdir(dir.Path("app.bak").c_str(), 0755) == 0 && !dir.Write("app.bak/occupied", "x").empty() &&
+                        dir.Exists("app.bak/occupied");
             break;
         }
     }
@@ -167,21 +167,22 @@ void expectContent(const ConfigDir& dir, const char* name, Content expected)
 TEST(RvConfigReplace, EveryFaultKeepsTheData)
 {
     const FaultCase cases[] = {
-        {"full disk", 0, [](SysCall call, const char*) { return call == SysCall::Write ? ENOSPC : 0; },
-         RealFault::None, 0, "", Content::Old, Content::Absent, Content::Absent},
+        {"full disk", 0, [](SysCall call, const char*) { return call == SysCall::Write ? ENOSPC : 0; }, RealFault::None,
+         0, "", Content::Old, Content::Absent, Content::Absent},
         {"full disk, backups on", 1, [](SysCall call, const char*) { return call == SysCall::Write ? ENOSPC : 0; },
          RealFault::None, 0, "", Content::Old, Content::Absent, Content::Absent},
-        {"fsync fails", 0, [](SysCall call, const char*) { return call == SysCall::Sync ? EIO : 0; },
-         RealFault::None, 0, "", Content::Old, Content::Absent, Content::Absent},
-        {"close fails", 0, [](SysCall call, const char*) { return call == SysCall::Close ? EIO : 0; },
-         RealFault::None, 0, "", Content::Old, Content::Absent, Content::Absent},
+        {"fsync fails", 0, [](SysCall call, const char*) { return call == SysCall::Sync ? EIO : 0; }, RealFault::None,
+         0, "", Content::Old, Content::Absent, Content::Absent},
+        {"close fails", 0, [](SysCall call, const char*) { return call == SysCall::Close ? EIO : 0; }, RealFault::None,
+         0, "", Content::Old, Content::Absent, Content::Absent},
         {"file size limit", 0, nullptr, RealFault::FileSizeLimit, 0, "", Content::Old, Content::Absent,
          Content::Absent},
         {"read-only directory", 1, nullptr, RealFault::ReadOnlyDirectory, 0, "", Content::Old, Content::Absent,
          Content::Absent},
         // The rename over the old file fails: the plain steps take over.
-        {"rename over the file fails", 0, [](SysCall call, const char*) { return call == SysCall::Replace ? EBUSY : 0; },
-         RealFault::None, 1, "", Content::New, Content::Absent, Content::Absent},
+        {"rename over the file fails", 0,
+         [](SysCall call, const char*) { return call == SysCall::Replace ? EBUSY : 0; }, RealFault::None, 1, "",
+         Content::New, Content::Absent, Content::Absent},
         {"rename over and unlink fail", 0,
          [](SysCall call, const char*) { return call == SysCall::Replace || call == SysCall::Unlink ? EPERM : 0; },
          RealFault::None, 1, "rvConfig: unlink({ini}) failed: Operation not permitted (1).", Content::New,
@@ -199,8 +200,7 @@ TEST(RvConfigReplace, EveryFaultKeepsTheData)
          Content::Old, Content::Absent},
         {"the temporary file can neither move nor go", 1,
          [](SysCall call, const char* from) {
-             const bool moveOrRemove =
-                 call == SysCall::Replace || call == SysCall::Rename || call == SysCall::Unlink;
+             const bool moveOrRemove = call == SysCall::Replace || call == SysCall::Rename || call == SysCall::Unlink;
              return moveOrRemove && endsWith(from, ".new") ? EIO : 0;
          },
          RealFault::None, 0,
@@ -294,10 +294,9 @@ TEST(RvConfigReplace, RewrittenFileKeepsItsPermissions)
         mode_t umask;
         mode_t expected;
     } rows[] = {
-        {0600, 022, 0600},  // a file kept from others stays so
-        {0660, 022, 0660},  // the old bits, not those the umask would give
-        {0644, 077, 0644},
-        {-1, 027, 0640},    // a new file: as fopen makes it
+        {0600, 022, 0600},                   // a file kept from others stays so
+        {0660, 022, 0660},                   // the old bits, not those the umask would give
+        {0644, 077, 0644}, {-1, 027, 0640},  // a new file: as fopen makes it
         {-1, 0, 0666},
     };
     for (unsigned int backups : {0u, 1u}) {

@@ -17,8 +17,13 @@ TEST(RvConfigTyped, NumbersFromText)
         int number;
         double real;
     } rows[] = {
-        {"abc", 0, 0.0},    {"", 0, 0.0},     {"12abc", 12, 12.0},        {" 42", 42, 42.0},
-        {"0x10", 0, 16.0},  {"1e3", 1, 1e3},  {"99999999999", 2147483647, 99999999999.0},
+        {"abc", 0, 0.0},
+        {"", 0, 0.0},
+        {"12abc", 12, 12.0},
+        {" 42", 42, 42.0},
+        {"0x10", 0, 16.0},
+        {"1e3", 1, 1e3},
+        {"99999999999", 2147483647, 99999999999.0},
         {"-99999999999", -2147483647 - 1, -99999999999.0},
     };
     for (const auto& row : rows) {
@@ -52,7 +57,7 @@ TEST(RvConfigTyped, BoolsAreWholeWords)
     const struct {
         const char* text;
         unsigned int value;
-    } rows[] = {{"True", 1}, {"tRuE", 1}, {"1", 1},  {"FALSE", 0}, {"0", 0},  {"maybe", 7},
+    } rows[] = {{"True", 1}, {"tRuE", 1}, {"1", 1},  {"FALSE", 0}, {"0", 0}, {"maybe", 7},
                 {"", 7},     {"yes", 7},  {"00", 7}, {" true", 7}, {"2", 7}};
     for (const auto& row : rows) {
         config.PutValue("b", row.text, "");

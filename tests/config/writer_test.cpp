@@ -15,8 +15,8 @@ namespace {
 
 using tessaline::config::testing::SetFaultHook;
 using tessaline::config::testing::SysCall;
-using tessaline::test::ConfigDir;
 using tessaline::test::body;
+using tessaline::test::ConfigDir;
 using Change = std::function<void(rvConfig&)>;
 
 std::string rewrite(const std::string& content, const Change& change)

@@ -200,14 +200,14 @@ TEST(TwoFishText, NullsAndMalformedTextAreSafe)
     // blocks: only whole blocks count, nothing is read past the text.
     ASSERT_EQ(1, TwoFishEncrypt(kKey128, data, 4, text));
     const std::string whole = text;
-    for (const std::string& shape : {std::string(), std::string("A"), whole.substr(0, 31),
-                                     whole + "F", whole + "0123456789ABCDEF0"}) {
+    for (const std::string& shape :
+         {std::string(), std::string("A"), whole.substr(0, 31), whole + "F", whole + "0123456789ABCDEF0"}) {
         std::vector<char> copy(shape.begin(), shape.end());
         copy.push_back('\0');
         length = sizeof out;
         EXPECT_EQ(1, TwoFishDecrypt(kKey128, copy.data(), out, &length)) << shape;
-        EXPECT_EQ(shape.size() < 32 ? std::string() : std::string(data, data + 4),
-                  std::string(out, out + length)) << shape;
+        EXPECT_EQ(shape.size() < 32 ? std::string() : std::string(data, data + 4), std::string(out, out + length))
+            << shape;
     }
 
     // Non-hex digits and a wrong key still "succeed", within the buffers.

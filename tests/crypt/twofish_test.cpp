@@ -73,8 +73,7 @@ TEST(TwofishEngine, DecryptInvertsEncryptForEveryKeySizeAndDirection)
             EXPECT_EQ(bits, key.keyLen);
             cipherInstance cipher = MakeCipher(MODE_ECB);
             std::vector<unsigned char> sealed(64), opened(64);
-            EXPECT_EQ(512, blockEncrypt(&cipher, &key, const_cast<unsigned char*>(plain.data()), 512,
-                                        sealed.data()));
+            EXPECT_EQ(512, blockEncrypt(&cipher, &key, const_cast<unsigned char*>(plain.data()), 512, sealed.data()));
             EXPECT_NE(plain, sealed);
             // A key made for either direction gives the same cipher text.
             if (firstSealed.empty())
@@ -223,8 +222,7 @@ TEST(TwofishEngine, CbcChainsBlockWordsAcrossCalls)
     cipherInstance stepwise = MakeCipher(MODE_CBC);
     std::vector<unsigned char> inSteps(48);
     for (int i = 0; i < 3; ++i)
-        blockEncrypt(&stepwise, &key, const_cast<unsigned char*>(plain.data()) + 16 * i, 128,
-                     inSteps.data() + 16 * i);
+        blockEncrypt(&stepwise, &key, const_cast<unsigned char*>(plain.data()) + 16 * i, 128, inSteps.data() + 16 * i);
     EXPECT_EQ(once, inSteps);
     EXPECT_EQ((uint32_t(once[32]) << 24) | (once[33] << 16) | (once[34] << 8) | once[35], whole.iv32[0]);
 

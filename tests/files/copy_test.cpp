@@ -19,11 +19,10 @@ using tessaline::files::Sys;
 
 namespace {
 
-int Copy(const std::string& source, const std::string& target, unsigned recurse,
-         unsigned overwrite, unsigned link = 0, unsigned move = 0)
+int Copy(const std::string& source, const std::string& target, unsigned recurse, unsigned overwrite, unsigned link = 0,
+         unsigned move = 0)
 {
-    return rvCopyFile(source.c_str(), target.c_str(), recurse, overwrite, link, move, nullptr,
-                      nullptr, 0640);
+    return rvCopyFile(source.c_str(), target.c_str(), recurse, overwrite, link, move, nullptr, nullptr, 0640);
 }
 
 void SetTime(const std::string& path, time_t when)
@@ -130,8 +129,7 @@ TEST(CopyFile, FailedCopyRemovesTheTargetAndKeepsTheSource)
          }},
         {"the source ends early under the kernel copy",
          [] {
-             Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t,
-                                        unsigned int) -> ssize_t {
+             Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t, unsigned int) -> ssize_t {
                  return ++calls == 1 ? realKernelCopy(from, nullptr, to, nullptr, 1000, 0) : 0;
              };
              Sys().read = [](int, void*, size_t) -> ssize_t { return 0; };
@@ -143,8 +141,9 @@ TEST(CopyFile, FailedCopyRemovesTheTargetAndKeepsTheSource)
          }},
         {"the disk fills under the kernel copy",
          [] {
-             Sys().copy_file_range = [](int, loff_t*, int, loff_t*, size_t,
-                                        unsigned int) -> ssize_t { return Fail(ENOSPC); };
+             Sys().copy_file_range = [](int, loff_t*, int, loff_t*, size_t, unsigned int) -> ssize_t {
+                 return Fail(ENOSPC);
+             };
              Sys().write = [](int, const void*, size_t) -> ssize_t { return Fail(ENOSPC); };
          }},
         {"the target fails to close",
@@ -179,8 +178,7 @@ TEST(CopyFile, TheLoopFinishesWhatTheKernelCopyLeaves)
     static const auto realKernelCopy = Sys().copy_file_range;
     ScopedSysCalls restore;
     calls = 0;
-    Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t,
-                               unsigned int) -> ssize_t {
+    Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t, unsigned int) -> ssize_t {
         return ++calls == 1 ? realKernelCopy(from, nullptr, to, nullptr, 12345, 0) : Fail(EXDEV);
     };
     EXPECT_EQ(1, Copy(source, dir / "target", 0, 1));

@@ -37,8 +37,7 @@ class DirIteratorTest : public testing::Test {
 protected:
     void SetUp() override
     {
-        for (const char* name : {"a.log", ".log", ".hidden", "a.c", "b.c", "bb.c", "with space.txt",
-                                 "new\nline.txt"}) {
+        for (const char* name : {"a.log", ".log", ".hidden", "a.c", "b.c", "bb.c", "with space.txt", "new\nline.txt"}) {
             Put(m_dir / name, "x");
         }
         std::filesystem::create_directory(m_dir / "sub");
@@ -51,8 +50,8 @@ protected:
 
 TEST_F(DirIteratorTest, PatternsMatchByFnmatch)
 {
-    const Names all = {".", "..", "a.log", ".log", ".hidden", "a.c", "b.c", "bb.c",
-                       "with space.txt", "new\nline.txt", "sub"};
+    const Names all = {".",   "..",   "a.log",          ".log",          ".hidden", "a.c",
+                       "b.c", "bb.c", "with space.txt", "new\nline.txt", "sub"};
     const struct {
         std::string path;
         Names expected;

@@ -54,11 +54,9 @@ bool IsTarget(const char* path)
     return length >= 6 && std::strcmp(path + length - 6, "target") == 0;
 }
 
-
 int CopyOver(const Paths& paths, unsigned overwrite, unsigned move = 0)
 {
-    return rvCopyFile(paths.source.c_str(), paths.target.c_str(), 0, overwrite, 0, move, nullptr,
-                      nullptr, 0644);
+    return rvCopyFile(paths.source.c_str(), paths.target.c_str(), 0, overwrite, 0, move, nullptr, nullptr, 0644);
 }
 
 void* const kBadHandle = reinterpret_cast<void*>(static_cast<intptr_t>(-1));
@@ -66,8 +64,7 @@ void* const kBadHandle = reinterpret_cast<void*>(static_cast<intptr_t>(-1));
 // WriteFile of `data` at the end of `path`: the count written, or -errno.
 int Append(const std::string& path, const std::string& data)
 {
-    void* handle = CreateFile(path.c_str(), O_WRONLY | O_APPEND | O_CLOEXEC, 0, nullptr, 0, 0,
-                              nullptr);
+    void* handle = CreateFile(path.c_str(), O_WRONLY | O_APPEND | O_CLOEXEC, 0, nullptr, 0, 0, nullptr);
     if (handle == kBadHandle) {
         return INT_MIN;
     }
@@ -177,8 +174,7 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
         {"target directory cannot be made (EROFS)", false,
          [] { Sys().mkdir = [](const char*, mode_t) { return Fail(EROFS); }; },
          [](const Paths& p) {
-             return rvCopyFile(p.source.c_str(), (p.target + ".d/target").c_str(), 0, 1, 0, 0,
-                               nullptr, nullptr, 0644);
+             return rvCopyFile(p.source.c_str(), (p.target + ".d/target").c_str(), 0, 1, 0, 0, nullptr, nullptr, 0644);
          },
          0, kOld},
         {"up to date: never opened", false,
@@ -194,8 +190,7 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
          0, std::string(kSource.size(), 'x')},
         {"read-only directory, new target", true, nullptr,
          [](const Paths& p) {
-             return rvCopyFile(p.source.c_str(), (p.readOnly + "/new").c_str(), 0, 0, 0, 0,
-                               nullptr, nullptr, 0644);
+             return rvCopyFile(p.source.c_str(), (p.readOnly + "/new").c_str(), 0, 0, 0, 0, nullptr, nullptr, 0644);
          },
          0, kOld},
 
@@ -216,8 +211,7 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
          0, kMissing},
         {"file size limit, replacing a target", true, [] { LimitFileSize(20000); },
          [](const Paths& p) { return CopyOver(p, 1); }, 0, kMissing},
-        {"source size unknown (fstat fails)", false,
-         [] { Sys().fstat = [](int, struct stat*) { return Fail(EIO); }; },
+        {"source size unknown (fstat fails)", false, [] { Sys().fstat = [](int, struct stat*) { return Fail(EIO); }; },
          [](const Paths& p) { return CopyOver(p, 1); }, 0, kMissing},
         {"read fails (EIO)", false,
          [] {
@@ -246,11 +240,9 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
          [](const Paths& p) { return CopyOver(p, 1); }, 0, kMissing},
 
         // Where the cleanup itself cannot run, the truncated target stays.
-        {"read-only directory, replacing a target past a size limit", true,
-         [] { LimitFileSize(20000); },
+        {"read-only directory, replacing a target past a size limit", true, [] { LimitFileSize(20000); },
          [](const Paths& p) {
-             return rvCopyFile(p.source.c_str(), (p.readOnly + "/target").c_str(), 0, 1, 0, 0,
-                               nullptr, nullptr, 0644);
+             return rvCopyFile(p.source.c_str(), (p.readOnly + "/target").c_str(), 0, 1, 0, 0, nullptr, nullptr, 0644);
          },
          0, kSource.substr(0, 20000)},
         {"the failed copy cannot be removed", false,
@@ -271,8 +263,8 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
          [](const Paths& p) { return CopyOver(p, 1, 1); }, 1, kSource},
 
         // WriteFile: a failed write adds nothing; a short one only what fits.
-        {"WriteFile on /dev/full", false, nullptr,
-         [](const Paths&) { return Append("/dev/full", "x"); }, -ENOSPC, kOld},
+        {"WriteFile on /dev/full", false, nullptr, [](const Paths&) { return Append("/dev/full", "x"); }, -ENOSPC,
+         kOld},
         {"WriteFile at a file size limit", true, [] { LimitFileSize(16); },
          [](const Paths& p) { return Append(p.target, "more"); }, -EFBIG, kOld},
         {"WriteFile across a file size limit", true, [] { LimitFileSize(18); },

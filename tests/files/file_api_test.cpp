@@ -67,8 +67,7 @@ int LockTestFromChild(const std::string& path)
 TEST(FileHandles, ReadWriteSeekAndSize)
 {
     TempDir dir;
-    void* handle = CreateFile((dir / "data").c_str(), O_RDWR | O_CREAT, 0, nullptr, O_TRUNC,
-                              0600, nullptr);
+    void* handle = CreateFile((dir / "data").c_str(), O_RDWR | O_CREAT, 0, nullptr, O_TRUNC, 0600, nullptr);
     ASSERT_NE(kInvalid, handle);
     unsigned long done = 0;
     EXPECT_EQ(1, WriteFile(handle, "hello world", 11, &done, nullptr));
@@ -166,8 +165,7 @@ TEST(CreateFile, RealFailures)
     EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(2900));
 
     const std::string there = Put(dir / "there", "keep");
-    EXPECT_EQ(kInvalid, CreateFile(there.c_str(), O_RDWR | O_CREAT, 0, nullptr, O_EXCL, 0600,
-                                   nullptr));
+    EXPECT_EQ(kInvalid, CreateFile(there.c_str(), O_RDWR | O_CREAT, 0, nullptr, O_EXCL, 0600, nullptr));
     EXPECT_EQ(EEXIST, GetLastError());
     EXPECT_EQ("keep", Slurp(there));
 }

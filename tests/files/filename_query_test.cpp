@@ -13,8 +13,14 @@ namespace {
 
 using tessaline::test::TempDir;
 
-std::string ToUnix(std::string text) { return rvFilename::XlatPathToUNIX(text.data()); }
-std::string ToDos(std::string text) { return rvFilename::XlatPathToDOS(text.data()); }
+std::string ToUnix(std::string text)
+{
+    return rvFilename::XlatPathToUNIX(text.data());
+}
+std::string ToDos(std::string text)
+{
+    return rvFilename::XlatPathToDOS(text.data());
+}
 
 TEST(rvFilenameTranslate, TextsAndRopes)
 {

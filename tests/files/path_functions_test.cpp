@@ -25,7 +25,8 @@ TEST(CreateDir, AbsoluteNames)
     mode_t savedMask = umask(022);
     EXPECT_EQ(CreateDir((tmp / "a/b/c").c_str(), 0), 1);
     umask(savedMask);
-    EXPECT_TRUE(std::filesystem::is_directory(tmp / "a") && std::filesystem::is_directory(tmp / "a/b") && std::filesystem::is_directory(tmp / "a/b/c"));
+    EXPECT_TRUE(std::filesystem::is_directory(tmp / "a") && std::filesystem::is_directory(tmp / "a/b") &&
+                std::filesystem::is_directory(tmp / "a/b/c"));
     struct stat info;
     ASSERT_EQ(stat((tmp / "a/b/c").c_str(), &info), 0);
     EXPECT_EQ(info.st_mode & 0777, 0755u);
@@ -58,12 +59,13 @@ TEST(CreateDir, RelativeAndAwkwardNames)
     EXPECT_EQ(CreateDir("old/new", 0), 1);
     EXPECT_TRUE(std::filesystem::is_directory("old/new"));
     EXPECT_EQ(CreateDir("new1/new2", 0), 0);
-    for (const std::string& name : {std::string(), std::string("://"), std::string("a\\b\\c"),
-                                    std::string(10000, '\\'), tmp / std::string(10000, 'x')})
+    for (const std::string& name : {std::string(), std::string("://"), std::string("a\\b\\c"), std::string(10000, '\\'),
+                                    tmp / std::string(10000, 'x')})
         EXPECT_EQ(CreateDir(name.c_str(), 0), 0) << name.substr(0, 80);
     EXPECT_EQ(CreateDir(nullptr, 0), 0);
     EXPECT_EQ(CreateDir("////", 0), 1);
-    EXPECT_FALSE(std::filesystem::is_directory("newdir") || std::filesystem::is_directory("new1") || std::filesystem::is_directory("a\\b\\c"));
+    EXPECT_FALSE(std::filesystem::is_directory("newdir") || std::filesystem::is_directory("new1") ||
+                 std::filesystem::is_directory("a\\b\\c"));
     ASSERT_EQ(chdir(saved), 0);
 }
 

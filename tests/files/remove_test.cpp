@@ -24,8 +24,7 @@ namespace {
 
 std::string CouldNotRemove(const std::string& path, int error)
 {
-    return "rvUnlink: Could not remove " + path + ": " + std::strerror(error) + " (" +
-           std::to_string(error) + ").\n";
+    return "rvUnlink: Could not remove " + path + ": " + std::strerror(error) + " (" + std::to_string(error) + ").\n";
 }
 
 }  // namespace
@@ -136,8 +135,8 @@ TEST(Unlink, MembersAreNamedAsTheFileNameJoinNamesThem)
     TempDir dir;
     Put(dir / "sub/file", "");
     for (const std::string& directory : {dir.path(), dir / "", std::string("rel/dir")}) {
-        for (const char* entry : {"plain.txt", "sub", "...", "x.", "a.b.c", ".hidden",
-                                  "back\\slash.e", "no_ext", "http:"}) {
+        for (const char* entry :
+             {"plain.txt", "sub", "...", "x.", "a.b.c", ".hidden", "back\\slash.e", "no_ext", "http:"}) {
             SCOPED_TRACE(directory + " + " + entry);
             rvFilename item(entry, 0);
             item.Directory(directory.c_str());

@@ -19,8 +19,9 @@ inline int Fail(int error)
 // buffer, where the read and write seams see every byte.
 inline void NoKernelCopy()
 {
-    files::Sys().copy_file_range = [](int, loff_t*, int, loff_t*, size_t,
-                                      unsigned int) -> ssize_t { return Fail(EXDEV); };
+    files::Sys().copy_file_range = [](int, loff_t*, int, loff_t*, size_t, unsigned int) -> ssize_t {
+        return Fail(EXDEV);
+    };
 }
 
 }  // namespace tessaline::test

@@ -103,13 +103,16 @@ TEST(MCondVar, CancelledWaiterLeavesCheckedMutexFree)
     } shared;
     ASSERT_EQ(0, shared.locked.Init(0));
     pthread_t waiter;
-    ASSERT_EQ(0, pthread_create(&waiter, nullptr, [](void* arg) -> void* {
-        auto& state = *static_cast<Shared*>(arg);
-        state.mutex.Lock(nullptr);
-        state.locked.Signal();
-        state.cond.Wait(state.mutex, nullptr, 0);
-        return nullptr;
-    }, &shared));
+    ASSERT_EQ(0, pthread_create(
+                     &waiter, nullptr,
+                     [](void* arg) -> void* {
+                         auto& state = *static_cast<Shared*>(arg);
+                         state.mutex.Lock(nullptr);
+                         state.locked.Signal();
+                         state.cond.Wait(state.mutex, nullptr, 0);
+                         return nullptr;
+                     },
+                     &shared));
     ASSERT_EQ(0, shared.locked.Wait());
     // Deferred: the request takes effect inside the condition wait.
     ASSERT_EQ(0, pthread_cancel(waiter));

@@ -211,10 +211,12 @@ TEST(MThread, CreatedThreadBlocksEverySignalButKill)
     MThread thread;
     sigset_t mask;
     sigemptyset(&mask);
-    ASSERT_EQ(0, thread.Create([](void* arg) -> void* {
-        pthread_sigmask(SIG_BLOCK, nullptr, static_cast<sigset_t*>(arg));
-        return nullptr;
-    }, &mask, 0, 0, 0, nullptr));
+    ASSERT_EQ(0, thread.Create(
+                     [](void* arg) -> void* {
+                         pthread_sigmask(SIG_BLOCK, nullptr, static_cast<sigset_t*>(arg));
+                         return nullptr;
+                     },
+                     &mask, 0, 0, 0, nullptr));
     ASSERT_EQ(0, thread.Wait(nullptr, nullptr, -1));
     for (int signal : {SIGHUP, SIGINT, SIGQUIT, SIGUSR1, SIGUSR2, SIGPIPE, SIGALRM, SIGTERM, SIGCHLD}) {
         EXPECT_EQ(1, sigismember(&mask, signal)) << signal;

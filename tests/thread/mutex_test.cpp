@@ -17,8 +17,8 @@ namespace {
 std::string ExpectedLine(int code)
 {
     char line[256];
-    std::snprintf(line, sizeof line, "Thread #%d error: %s (%d)\n",
-                  static_cast<int>(pthread_self()), std::strerror(code), code);
+    std::snprintf(line, sizeof line, "Thread #%d error: %s (%d)\n", static_cast<int>(pthread_self()),
+                  std::strerror(code), code);
     return line;
 }
 
@@ -55,9 +55,9 @@ TEST(MMutex, RecursiveHolderNeedsAsManyUnlocksAsLocks)
     EXPECT_EQ(0, mutex.Unlock(nullptr));
     EXPECT_EQ(0, mutex.Locked());
     EXPECT_EQ(0, OnOtherThread([&] {
-        int status = mutex.Try(nullptr);
-        return status == 0 ? mutex.Unlock(nullptr) : status;
-    }));
+                  int status = mutex.Try(nullptr);
+                  return status == 0 ? mutex.Unlock(nullptr) : status;
+              }));
 }
 
 TEST(MMutex, CheckedRefusesHolderAndOthersWithoutQueueing)

@@ -21,9 +21,9 @@ TEST(HashToken, ExactAndLooseSearch)
         {"AB", nested, 4, 0, 11, 11},
         {"abcd", nested, 4, 0, -1, 12},  // the longest prefix wins
         {"ax", nested, 4, 0, -1, 10},
-        {"bat", nested, 4, 0, -1, 21},   // row `high` is searched
+        {"bat", nested, 4, 0, -1, 21},  // row `high` is searched
         {"c", nested, 4, 0, -1, -1},
-        {"x", duplicates, 2, 0, 1, 2},   // exact: the first; loose: the last
+        {"x", duplicates, 2, 0, 1, 2},  // exact: the first; loose: the last
         {"anything", withEmpty, 1, 0, -1, 5},
         // The range limits both searches.
         {"files", schemes, 2, 1, -1, -1},

@@ -158,10 +158,7 @@ public:
     /// The name comparison of both table levels.
     struct eqcstr {
         /// Names are equal when strcasecmp of their texts gives 0.
-        bool operator()(const cfgStr& a, const cfgStr& b) const
-        {
-            return strcasecmp(a.c_str(), b.c_str()) == 0;
-        }
+        bool operator()(const cfgStr& a, const cfgStr& b) const { return strcasecmp(a.c_str(), b.c_str()) == 0; }
     };
 
     /// @name Tables

@@ -83,8 +83,7 @@ TESSALINE_API int rvEncrypt(unsigned char* data, unsigned long length, char* out
 /// Returns 1 on success (with no check that a wrong key was used), 0 for a
 /// null text, out or length, a failed allocation or a capacity under 37 for
 /// chained text.
-TESSALINE_API int rvDecrypt(char* text, unsigned char* out, unsigned long* length,
-                            unsigned int* wasPlain);
+TESSALINE_API int rvDecrypt(char* text, unsigned char* out, unsigned long* length, unsigned int* wasPlain);
 
 /// The address this call will return to, that is, where it was called from.
 /// The argument has no effect. The function is never inlined; under clang
@@ -105,8 +104,7 @@ TESSALINE_API int RVUI_Encrypt(unsigned char* data, unsigned long length, char* 
 /** rvDecrypt under a plain name, for C hosts: marked, chained or clear text
     into `out`; *length is the capacity on entry and the bytes stored on
     return, and *wasPlain (if given) tells whether the cipher was used. */
-TESSALINE_API int RVUI_Decrypt(char* text, unsigned char* out, unsigned long* length,
-                               unsigned int* wasPlain);
+TESSALINE_API int RVUI_Decrypt(char* text, unsigned char* out, unsigned long* length, unsigned int* wasPlain);
 
 TESSALINE_EXTERN_C_END
 

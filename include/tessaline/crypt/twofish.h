@@ -138,14 +138,14 @@ enum { BAD_ENDIAN = -9 };
 /** A key and its schedule: made by makeKey, keyed through key32 and reKey.
     A plain structure of the caller's; it may be copied. */
 typedef struct keyInstance {
-    uint8_t direction;     /**< DIR_ENCRYPT or DIR_DECRYPT: current subkey order. */
-    int32_t keyLen;        /**< Key size in bits, rounded up to a multiple of 64. */
-    char keyMaterial[68];  /**< Unused apart from a NUL at index 64. */
-    uint32_t keySig;       /**< Neither set nor tested. */
-    int32_t numRounds;     /**< 16 for 128, 192 and 256 bits. */
-    uint32_t key32[8];     /**< The key words; words behind the key size are 0. */
-    uint32_t sboxKeys[4];  /**< The Reed-Solomon words, last one first. */
-    uint32_t subKeys[40];  /**< 8 whitening words, then 16 pairs of round subkeys. */
+    uint8_t direction;    /**< DIR_ENCRYPT or DIR_DECRYPT: current subkey order. */
+    int32_t keyLen;       /**< Key size in bits, rounded up to a multiple of 64. */
+    char keyMaterial[68]; /**< Unused apart from a NUL at index 64. */
+    uint32_t keySig;      /**< Neither set nor tested. */
+    int32_t numRounds;    /**< 16 for 128, 192 and 256 bits. */
+    uint32_t key32[8];    /**< The key words; words behind the key size are 0. */
+    uint32_t sboxKeys[4]; /**< The Reed-Solomon words, last one first. */
+    uint32_t subKeys[40]; /**< 8 whitening words, then 16 pairs of round subkeys. */
     /** Key-dependent S-boxes combined with the MDS matrix, as one run of 1024
         words: index 2x serves byte 0 (bits 31-24) of the g input with value
         x, 2x+1 byte 1; 512+2x serves byte 2, 512+2x+1 byte 3. */
@@ -155,10 +155,10 @@ typedef struct keyInstance {
 /** A cipher mode and its feedback state, made by cipherInit. A plain
     structure of the caller's; ECB never writes it. */
 typedef struct cipherInstance {
-    uint8_t mode;          /**< MODE_ECB, MODE_CBC or MODE_CFB1. */
-    uint8_t IV[16];        /**< The CFB1 feedback register. */
-    uint32_t cipherSig;    /**< Neither set nor tested. */
-    uint32_t iv32[4];      /**< The CBC chaining value, as four block words. */
+    uint8_t mode;       /**< MODE_ECB, MODE_CBC or MODE_CFB1. */
+    uint8_t IV[16];     /**< The CFB1 feedback register. */
+    uint32_t cipherSig; /**< Neither set nor tested. */
+    uint32_t iv32[4];   /**< The CBC chaining value, as four block words. */
 } cipherInstance;
 
 TESSALINE_EXTERN_C_BEGIN
@@ -185,8 +185,7 @@ TESSALINE_API extern int debugCompile;        /**< 0; nothing reads it. */
    key32 and stores a NUL at keyMaterial[64]. With a null or empty
    keyMaterial returns TRUE: set key32 and call reKey next. Key text is
    always refused with BAD_KEY_MAT, as is a null key. */
-TESSALINE_API int makeKey(keyInstance* key, unsigned char direction, int keyLen,
-                          char* keyMaterial);
+TESSALINE_API int makeKey(keyInstance* key, unsigned char direction, int keyLen, char* keyMaterial);
 
 /** Builds MDStab if needed, then sboxKeys, subKeys and sBox8x32 from key32,
    keyLen and numRounds; for DIR_ENCRYPT the round subkey pairs are stored
@@ -208,12 +207,12 @@ TESSALINE_API int cipherInit(cipherInstance* cipher, unsigned char mode, char* I
    last partial output byte alone. A key built for the other direction is
    turned round first. With 0 or a negative inputLen nothing is done and
    inputLen comes back; null pointers with a positive inputLen give 0. */
-TESSALINE_API int blockEncrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input,
-                               int inputLen, unsigned char* outBuffer);
+TESSALINE_API int blockEncrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input, int inputLen,
+                               unsigned char* outBuffer);
 
 /** The inverse of blockEncrypt, with the same buffer rules. */
-TESSALINE_API int blockDecrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input,
-                               int inputLen, unsigned char* outBuffer);
+TESSALINE_API int blockDecrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input, int inputLen,
+                               unsigned char* outBuffer);
 
 /** Parses nothing and always returns BAD_ENDIAN: key words are set as
    numbers in key32 instead. */

@@ -98,9 +98,9 @@
 /// the target is opened (missing or unreadable source, refused scheme, an
 /// up-to-date target, a directory that cannot be made, a target that cannot
 /// be opened) leave the target byte for byte.
-TESSALINE_API int rvCopyFile(const char* source, const char* target, unsigned int recurse,
-                             unsigned int overwrite, unsigned int link, unsigned int move,
-                             const char* aux1, const char* aux2, unsigned long mode);
+TESSALINE_API int rvCopyFile(const char* source, const char* target, unsigned int recurse, unsigned int overwrite,
+                             unsigned int link, unsigned int move, const char* aux1, const char* aux2,
+                             unsigned long mode);
 
 /// Removes a file, the entries that match a wildcard, or, with `recurse`
 /// exactly 1, a directory tree; returns the number of files removed

@@ -61,14 +61,14 @@ public:
     /// or after a read error, whose code then stays in m_error and errno.
     int get_next();
 
-    int m_error;              ///< 0 at a clean end, else the read error.
-    DIR* m_dir;               ///< Null if opening failed.
-    int m_refs;               ///< Iterators that share this walk.
+    int m_error;  ///< 0 at a clean end, else the read error.
+    DIR* m_dir;   ///< Null if opening failed.
+    int m_refs;   ///< Iterators that share this walk.
     /// The one entry buffer of all copies. On 32-bit x86 the library reads
     /// entries with 64-bit offsets (dirent64's layout): a host built without
     /// _FILE_OFFSET_BITS=64 reads names through operator*, not through here.
     dirent* m_entry;
-    rvFilename m_pattern;     ///< Its text is the pattern alone.
+    rvFilename m_pattern;  ///< Its text is the pattern alone.
 };
 
 class TESSALINE_API rvDirIterator {

@@ -50,8 +50,8 @@ TESSALINE_EXTERN_C_BEGIN
  * Any other error tries again without a pause. Returns the handle, or
  * (void*)-1 with errno from the last attempt.
  */
-TESSALINE_API void* CreateFile(const char* path, int access, int share, void* security,
-                               int disposition, int mode, void* templateFile);
+TESSALINE_API void* CreateFile(const char* path, int access, int share, void* security, int disposition, int mode,
+                               void* templateFile);
 
 /** 1 when close succeeded, else 0 with errno set. */
 TESSALINE_API int CloseHandle(void* handle);
@@ -62,12 +62,11 @@ TESSALINE_API int CloseHandle(void* handle);
  * `*done` 0. On failure returns 0, stores (unsigned long)-1 in `*done` and
  * leaves the cause in errno. `done` may be null.
  */
-TESSALINE_API int ReadFile(void* handle, void* buffer, unsigned long count, unsigned long* done,
-                           void* overlapped);
+TESSALINE_API int ReadFile(void* handle, void* buffer, unsigned long count, unsigned long* done, void* overlapped);
 
 /** As ReadFile, for writing: one write call, a short count is success. */
-TESSALINE_API int WriteFile(void* handle, const void* buffer, unsigned long count,
-                            unsigned long* done, void* overlapped);
+TESSALINE_API int WriteFile(void* handle, const void* buffer, unsigned long count, unsigned long* done,
+                            void* overlapped);
 
 /** The size of the open file, or -1 when fstat fails. */
 TESSALINE_API int64_t GetFileSize64(void* handle);

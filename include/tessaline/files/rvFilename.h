@@ -81,8 +81,8 @@ public:
     /// Returns the new text. With five null arguments the stored components
     /// are joined again; when they are all null too, nothing changes and ""
     /// comes back. Arguments may point into the object itself.
-    virtual const char* Join(const char* scheme, const char* server, const char* directory,
-                             const char* file, const char* ext);
+    virtual const char* Join(const char* scheme, const char* server, const char* directory, const char* file,
+                             const char* ext);
 
     /// Parts of the text found by rebuilding the wanted components and
     /// searching the text for them: a pointer to the first occurrence, which

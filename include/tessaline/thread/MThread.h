@@ -244,8 +244,8 @@ public:
     /// A clean-up handler for host code: unlocks the pthread_mutex_t given.
     static void Cleanup(void* mutex);
 
-    pthread_cond_t m_cond;       ///< The platform condition.
-    pthread_condattr_t m_attr;   ///< Its attribute object; it sets nothing.
+    pthread_cond_t m_cond;      ///< The platform condition.
+    pthread_condattr_t m_attr;  ///< Its attribute object; it sets nothing.
 };
 
 /// Abstract counting semaphore interface; MSemaphore implements it.

@@ -54,7 +54,7 @@ public:
 
     /// The present moment. (The name is parenthesised because windows-style
     /// headers define GetCurrentTime() as a macro.)
-    static rvTime (GetCurrentTime)();
+    static rvTime(GetCurrentTime)();
 
     /// m_time broken down by gmtime (GetGmtTm) or localtime (GetLocalTm).
     /// With a null `out` the result is the C library's static structure,
