@@ -9,7 +9,7 @@
 #ifndef TESSALINE_TESSALINE_H
 #define TESSALINE_TESSALINE_H
 
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 #include "tessaline/crypt/twofish.h"
 #include "tessaline/crypt/rvEncrypt.h"
 #include "tessaline/files/rvCopy.h"

@@ -22,7 +22,7 @@
 #include "tessaline/files/rvFilename.h"
 #include "tessaline/files/rvPath.h"
 #include "tessaline/util/HashToken.h"
-#include "util/scheme_tokens.h"
+#include "files/scheme_tokens.h"
 
 using tessaline::files::DirectoryFd;
 using tessaline::files::Links;

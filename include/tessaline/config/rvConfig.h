@@ -62,7 +62,7 @@
 #include <ext/rope>
 
 #include "tessaline/thread/MThread.h"
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 class TESSALINE_API rvConfig {
 public:

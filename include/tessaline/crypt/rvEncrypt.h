@@ -34,7 +34,7 @@
 #ifndef TESSALINE_CRYPT_RVENCRYPT_H
 #define TESSALINE_CRYPT_RVENCRYPT_H
 
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 #ifdef __cplusplus
 

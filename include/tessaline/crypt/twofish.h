@@ -52,7 +52,7 @@
 
 #include <stdint.h>
 
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 /* Each classic name is defined only if a host header has not already made
    it a macro, so either include order builds. C++ gets int constants (no

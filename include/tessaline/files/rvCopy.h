@@ -51,7 +51,7 @@
 
 #include <stdint.h>
 
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 /// Copies `source` to `target` and returns the number of files copied (a link
 /// made counts as one).

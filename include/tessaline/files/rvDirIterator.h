@@ -38,7 +38,7 @@
 #include <dirent.h>
 
 #include "tessaline/files/rvFilename.h"
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 /// The shared state of a walk. Hosts normally meet it only through
 /// rvDirIterator.

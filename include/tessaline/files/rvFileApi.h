@@ -33,7 +33,7 @@
 
 #include <stdint.h>
 
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 TESSALINE_EXTERN_C_BEGIN
 

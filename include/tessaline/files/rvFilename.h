@@ -37,7 +37,7 @@
 
 #include <ext/rope>
 
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 class TESSALINE_API rvFilename {
 public:

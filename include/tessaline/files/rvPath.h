@@ -13,7 +13,7 @@
 #ifndef TESSALINE_FILES_RVPATH_H
 #define TESSALINE_FILES_RVPATH_H
 
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 TESSALINE_EXTERN_C_BEGIN
 

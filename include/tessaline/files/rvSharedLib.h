@@ -33,7 +33,7 @@
 #define TESSALINE_FILES_RVSHAREDLIB_H
 
 #include "tessaline/files/rvFilename.h"
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 class TESSALINE_API rvSharedLib {
 public:

@@ -35,7 +35,7 @@
 #include <pthread.h>
 #include <semaphore.h>
 
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 /// Passes a thread-library result through the reporting rule: 0 gives 0;
 /// ENOENT, ESRCH and EAGAIN give -1 silently; any other value, negative ones

@@ -25,7 +25,7 @@
 
 #include <cstring>
 
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 #include "tessaline/util/rvString.h"
 
 /// One row of a token table: a word and the value a match gives.

@@ -19,7 +19,7 @@
 #ifndef TESSALINE_UTIL_RVSTRING_H
 #define TESSALINE_UTIL_RVSTRING_H
 
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 TESSALINE_EXTERN_C_BEGIN
 

@@ -22,7 +22,7 @@
 
 #include <time.h>
 
-#include "tessaline/util/export.h"
+#include "tessaline/export.h"
 
 class rvTimeSpan;
 

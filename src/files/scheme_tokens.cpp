@@ -1,4 +1,4 @@
-#include "util/scheme_tokens.h"
+#include "files/scheme_tokens.h"
 
 namespace tessaline {
 

@@ -1,7 +1,7 @@
 // The URL schemes that the file copier tells apart, as a token table sorted
 // for loose search. Private to the library.
-#ifndef TESSALINE_SRC_UTIL_SCHEME_TOKENS_H
-#define TESSALINE_SRC_UTIL_SCHEME_TOKENS_H
+#ifndef TESSALINE_SRC_FILES_SCHEME_TOKENS_H
+#define TESSALINE_SRC_FILES_SCHEME_TOKENS_H
 
 #include "tessaline/util/HashToken.h"
 

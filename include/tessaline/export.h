@@ -7,8 +7,8 @@
  * bracket the functions that keep plain, unmangled names so that C hosts and
  * dlsym() can find them.
  */
-#ifndef TESSALINE_UTIL_EXPORT_H
-#define TESSALINE_UTIL_EXPORT_H
+#ifndef TESSALINE_EXPORT_H
+#define TESSALINE_EXPORT_H
 
 #if defined(__GNUC__)
 /** Marks a class, function or variable that the library exports. */
