@@ -9,6 +9,7 @@
 #include "config/passes.h"
 #include "config/sys.h"
 #include "tessaline/config/rvConfig.h"
+#include "util/sys.h"
 
 using tessaline::config::ScopedClassLock;
 
@@ -20,13 +21,6 @@ constexpr int kOpenAttempts = 3;
 bool isTrimmed(char c)
 {
     return c == ' ' || c == '\t' || c == '\n' || c == '\r';
-}
-
-void pauseOneSecond()
-{
-    timespec remaining = {1, 0};
-    while (nanosleep(&remaining, &remaining) != 0 && errno == EINTR) {
-    }
 }
 
 FILE* openByMode(const char* name, rvConfig::OpenMode mode)
@@ -203,7 +197,7 @@ FILE* rvConfig::Open(const char* name, OpenMode mode)
         return nullptr;
     }
     for (int attempt = 1; (m_pFile = openByMode(name, mode)) == nullptr; ++attempt) {
-        pauseOneSecond();
+        tessaline::util::PauseOneSecond();
         if (attempt == kOpenAttempts) {
             return nullptr;
         }

@@ -13,6 +13,8 @@
 #include "config/sys.h"
 #include "tessaline/config/rvConfig.h"
 #include "tessaline/util/rvString.h"
+#include "util/error_text.h"
+#include "util/sys.h"
 
 using tessaline::config::ScopedClassLock;
 namespace sys = tessaline::config::sys;
@@ -23,13 +25,6 @@ constexpr int kCreateAttempts = 3;
 constexpr std::size_t kTimeBufferSize = 128;
 constexpr unsigned int kFreshFileMode = 0666;
 constexpr unsigned int kOwnerOnly = 0600;
-
-void pauseOneSecond()
-{
-    timespec remaining = {1, 0};
-    while (nanosleep(&remaining, &remaining) != 0 && errno == EINTR) {
-    }
-}
 
 // The temporary file. Every write is checked; after the first failure the
 // rest are skipped and the file is not used.
@@ -63,7 +58,7 @@ public:
                 }
                 return true;
             }
-            pauseOneSecond();
+            tessaline::util::PauseOneSecond();
         }
         return false;
     }
@@ -240,7 +235,7 @@ void writeIdentificationLine(TempFile& out)
 void reportUnlinkFailure(const char* name)
 {
     const int error = errno;
-    std::fprintf(stderr, "rvConfig: unlink(%s) failed: %s (%d).", name, std::strerror(error), error);
+    std::fprintf(stderr, "rvConfig: unlink(%s) failed: %s (%d).", name, tessaline::util::ErrorText(error), error);
 }
 
 // Replaces an existing file so that its name never stands empty: the old
@@ -274,7 +269,7 @@ unsigned int replaceInSteps(const char* configName, const char* tempName, const 
         if (rvConfig::m_bBackups != 0) {
             sys::Unlink(backupName.c_str());
             if (sys::Rename(configName, backupName.c_str()) != 0) {
-                std::fprintf(stderr, "Error creating backup config file %s: %s\n", configName, std::strerror(errno));
+                std::fprintf(stderr, "Error creating backup config file %s: %s\n", configName, tessaline::util::ErrorText(errno));
                 result = 0;
             }
         } else if (sys::Unlink(configName) != 0) {
@@ -283,7 +278,7 @@ unsigned int replaceInSteps(const char* configName, const char* tempName, const 
     }
     if (sys::Rename(tempName, configName) != 0) {
         const int error = errno;
-        std::fprintf(stderr, "rvConfig: rename(%s, %s) failed: %s (%d).", tempName, configName, std::strerror(error),
+        std::fprintf(stderr, "rvConfig: rename(%s, %s) failed: %s (%d).", tempName, configName, tessaline::util::ErrorText(error),
                      error);
         // Without backups the old file is gone and the temporary file holds
         // the only copy on disk: it stays.

@@ -12,6 +12,8 @@
 #include "files/open_at.h"
 #include "files/sys.h"
 #include "tessaline/util/rvString.h"
+#include "util/error_text.h"
+#include "util/sys.h"
 
 using tessaline::files::Descriptor;
 using tessaline::files::Handle;
@@ -35,12 +37,6 @@ int OpenRetryingInterrupts(Open open)
         fd = open();
     } while (fd < 0 && errno == EINTR);
     return fd;
-}
-
-void PauseOneSecond()
-{
-    const struct timespec pause = {1, 0};
-    Sys().nanosleep(&pause, nullptr);
 }
 
 // One read or write, repeated while a signal interrupts it.
@@ -71,7 +67,7 @@ void* OpenWithAttempts(Open open)
             break;
         }
         if (error == ENOENT || error == 0) {
-            PauseOneSecond();
+            tessaline::util::PauseOneSecond();
             errno = error;
         }
     }
@@ -153,7 +149,7 @@ int GetLastError()
 char* GetLastErrorText(char* buffer, unsigned long size, unsigned long error)
 {
     const int code = (error & kLowHalf) == kLastErrorSelector ? GetLastError() : static_cast<int>(error);
-    const char* text = std::strerror(code);
+    const char* text = tessaline::util::ErrorText(code);
     if (text == nullptr) {
         text = "undefined.";
     }

@@ -18,6 +18,7 @@
 #include "files/sys.h"
 #include "files/tree.h"
 #include "tessaline/files/rvFilename.h"
+#include "util/error_text.h"
 
 using tessaline::files::DirectoryFd;
 using tessaline::files::Links;
@@ -91,7 +92,7 @@ int RemoveFile(const Place& place)
     }
     if (Sys().unlinkat(place.directory, place.name, 0) != 0) {
         const int error = errno;
-        std::fprintf(stderr, "rvUnlink: Could not remove %s: %s (%d).\n", place.text, std::strerror(error), error);
+        std::fprintf(stderr, "rvUnlink: Could not remove %s: %s (%d).\n", place.text, tessaline::util::ErrorText(error), error);
         return 0;
     }
     return 1;

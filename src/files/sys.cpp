@@ -43,7 +43,7 @@ int StatFileSystem(const char* path, struct statfs* info)
 SysCalls g_sys = {
     OpenFile,       ::close,     ::read,    ::write,    ::copy_file_range, ::lseek,     StatHandle, StatPath,
     ::lockf,        ::access,    ::chmod,   ::mkdir,    ::unlink,          ::rmdir,     ::symlink,  ::realpath,
-    StatFileSystem, ::nanosleep, ::opendir, ::readdir,  ::closedir,        ::pathconf,  OpenFileAt, StatAt,
+    StatFileSystem, ::opendir, ::readdir,  ::closedir,        ::pathconf,  OpenFileAt, StatAt,
     ::faccessat,    ::unlinkat,  ::mkdirat, ::fchmodat, ::symlinkat,       ::fdopendir,
 };
 

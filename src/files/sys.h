@@ -1,7 +1,7 @@
 // The platform calls of the files subsystem, routed through one table so
 // that tests can make any of them fail on demand. The library reads the table
-// on every call; tests swap entries under a ScopedSysCalls and the old table
-// comes back when it goes out of scope. Not part of the installed interface.
+// on every call; a test swaps entries under a testing::ScopedSysCalls
+// (tests/support/scoped_sys_calls.h). Not part of the installed interface.
 //
 // Each call returns what the platform call returns and leaves its errno
 // untouched, so callers read the cause of a failure right after the call.
@@ -37,7 +37,6 @@ struct SysCalls {
     // realpath into a caller's area of PATH_MAX bytes.
     char* (*realpath)(const char* path, char* resolved);
     int (*statfs)(const char* path, struct statfs* info);
-    int (*nanosleep)(const struct timespec* pause, struct timespec* left);
     DIR* (*opendir)(const char* path);
     struct dirent* (*readdir)(DIR* dir);
     int (*closedir)(DIR* dir);
@@ -56,18 +55,6 @@ struct SysCalls {
 // The live table. Tests reach it by linking the library's objects
 // statically; the shared object does not export it.
 SysCalls& Sys();
-
-// Restores the table as it was at construction.
-class ScopedSysCalls {
-public:
-    ScopedSysCalls() : m_saved(Sys()) {}
-    ~ScopedSysCalls() { Sys() = m_saved; }
-    ScopedSysCalls(const ScopedSysCalls&) = delete;
-    ScopedSysCalls& operator=(const ScopedSysCalls&) = delete;
-
-private:
-    SysCalls m_saved;
-};
 
 namespace sys {
 

@@ -4,6 +4,7 @@
 #include <cstring>
 
 #include "tessaline/thread/MThread.h"
+#include "util/error_text.h"
 
 int CHECK_SYSERROR(int err)
 {
@@ -15,7 +16,7 @@ int CHECK_SYSERROR(int err)
     }
     // The line keeps its classic %d form; on LP64 that shows the low 32 bits
     // of the thread identifier.
-    std::fprintf(stderr, "Thread #%d error: %s (%d)\n", static_cast<int>(pthread_self()), std::strerror(err), err);
+    std::fprintf(stderr, "Thread #%d error: %s (%d)\n", static_cast<int>(pthread_self()), tessaline::util::ErrorText(err), err);
     return -1;
 }
 
@@ -28,7 +29,7 @@ int MThreadError::LastError()
 
 char* MThreadError::LastErrorText()
 {
-    return std::strerror(LastError());
+    return const_cast<char*>(tessaline::util::ErrorText(LastError()));
 }
 
 void MThreadError::StoreLastError(int code)

@@ -9,12 +9,14 @@
 
 #include "files/file_fixtures.h"
 #include "files/sys.h"
+#include "support/scoped_sys_calls.h"
+#include "util/sys.h"
 #include "files/sys_fakes.h"
 #include "support/temp_dir.h"
 #include "tessaline/files/rvCopy.h"
 
 using namespace tessaline::test;
-using tessaline::files::ScopedSysCalls;
+using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
 
 namespace {
@@ -86,8 +88,8 @@ TEST(CopyFile, OverwriteRules)
     Put(dir / "longer", "longer old content");
     EXPECT_EQ(1, Copy(source, dir / "longer", 0, 2)) << "2 truncates";
     EXPECT_EQ("new!", Slurp(dir / "longer"));
-    ScopedSysCalls restore;
-    Sys().nanosleep = [](const struct timespec*, struct timespec*) { return 0; };
+    ScopedSysCalls noPauses(tessaline::util::Sys());
+    tessaline::util::Sys().nanosleep = [](const struct timespec*, struct timespec*) { return 0; };
     EXPECT_EQ(0, Copy(source, dir / "nodir/x", 0, 2)) << "but makes no directories";
     EXPECT_FALSE(Exists(dir / "nodir"));
 }
@@ -157,7 +159,7 @@ TEST(CopyFile, FailedCopyRemovesTheTargetAndKeepsTheSource)
     for (const auto& c : cases) {
         SCOPED_TRACE(c.what);
         Put(target, "older target");
-        ScopedSysCalls restore;
+        ScopedSysCalls restore(Sys());
         calls = 0;
         c.breakIt();
         EXPECT_EQ(0, Copy(source, target, 0, 1, 0, 1));
@@ -176,7 +178,7 @@ TEST(CopyFile, TheLoopFinishesWhatTheKernelCopyLeaves)
     const std::string source = Put(dir / "source", content);
     static int calls;
     static const auto realKernelCopy = Sys().copy_file_range;
-    ScopedSysCalls restore;
+    ScopedSysCalls restore(Sys());
     calls = 0;
     Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t, unsigned int) -> ssize_t {
         return ++calls == 1 ? realKernelCopy(from, nullptr, to, nullptr, 12345, 0) : Fail(EXDEV);

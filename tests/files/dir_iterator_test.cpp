@@ -7,11 +7,13 @@
 
 #include "files/file_fixtures.h"
 #include "files/sys.h"
+#include "support/scoped_sys_calls.h"
+#include "util/sys.h"
 #include "support/temp_dir.h"
 #include "tessaline/files/rvDirIterator.h"
 
 using namespace tessaline::test;
-using tessaline::files::ScopedSysCalls;
+using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
 
 namespace {
@@ -82,7 +84,7 @@ TEST_F(DirIteratorTest, PatternsMatchByFnmatch)
 
 TEST_F(DirIteratorTest, FailuresEndTheWalk)
 {
-    ScopedSysCalls restore;
+    ScopedSysCalls restore(Sys());
     static const auto realReaddir = Sys().readdir;
     Sys().readdir = [](DIR* dir) -> dirent* {
         static int reads = 0;

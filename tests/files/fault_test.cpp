@@ -17,13 +17,15 @@
 
 #include "files/file_fixtures.h"
 #include "files/sys.h"
+#include "support/scoped_sys_calls.h"
+#include "util/sys.h"
 #include "files/sys_fakes.h"
 #include "support/temp_dir.h"
 #include "tessaline/files/rvCopy.h"
 #include "tessaline/files/rvFileApi.h"
 
 using namespace tessaline::test;
-using tessaline::files::ScopedSysCalls;
+using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
 using tessaline::files::SysCalls;
 
@@ -194,8 +196,8 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
          },
          0, kOld},
 
-        // Failures after the target is opened remove it, as specified: an
-        // old target was truncated by then and its data is gone.
+        // A failure after the target is opened removes the target: rvCopyFile
+        // leaves no partial copy, and an old target was truncated by then.
         {"full disk: /dev/full behind the target name", false, nullptr,
          [](const Paths& p) {
              unlink(p.target.c_str());
@@ -295,8 +297,9 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
         if (c.inChild) {
             result = RunInChild(c.fault, c.action, paths);
         } else {
-            ScopedSysCalls restore;
-            Sys().nanosleep = [](const struct timespec*, struct timespec*) { return 0; };
+            ScopedSysCalls restore(Sys());
+            ScopedSysCalls noPauses(tessaline::util::Sys());
+            tessaline::util::Sys().nanosleep = [](const struct timespec*, struct timespec*) { return 0; };
             if (c.fault != nullptr) {
                 c.fault();
             }

@@ -11,11 +11,13 @@
 
 #include "files/file_fixtures.h"
 #include "files/sys.h"
+#include "support/scoped_sys_calls.h"
+#include "util/sys.h"
 #include "support/temp_dir.h"
 #include "tessaline/files/rvFileApi.h"
 
 using namespace tessaline::test;
-using tessaline::files::ScopedSysCalls;
+using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
 
 namespace {
@@ -42,7 +44,7 @@ struct OpenScript {
             ++opens;
             return realOpen(path, flags, mode);
         };
-        Sys().nanosleep = [](const struct timespec*, struct timespec*) {
+        tessaline::util::Sys().nanosleep = [](const struct timespec*, struct timespec*) {
             ++sleeps;
             return 0;
         };
@@ -104,7 +106,7 @@ TEST(FileHandles, InterruptedReadIsRepeated)
 {
     TempDir dir;
     void* handle = CreateFile(Put(dir / "x", "abc").c_str(), O_RDWR, 0, nullptr, 0, 0, nullptr);
-    ScopedSysCalls restore;
+    ScopedSysCalls restore(Sys());
     static int reads;
     reads = 0;
     static const auto realRead = Sys().read;
@@ -141,7 +143,8 @@ TEST(CreateFile, AttemptsAndPausesFollowTheError)
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.what);
-        ScopedSysCalls restore;
+        ScopedSysCalls restore(Sys());
+        ScopedSysCalls noPauses(tessaline::util::Sys());
         OpenScript::Install(c.codes, c.count);
         void* handle = CreateFile(path.c_str(), O_RDONLY, 0, nullptr, 0, 0, nullptr);
         const int error = errno;

@@ -11,13 +11,15 @@
 #include "files/file_fixtures.h"
 #include "files/member_text.h"
 #include "files/sys.h"
+#include "support/scoped_sys_calls.h"
+#include "util/sys.h"
 #include "support/capture_stderr.h"
 #include "support/temp_dir.h"
 #include "tessaline/files/rvCopy.h"
 #include "tessaline/files/rvFilename.h"
 
 using namespace tessaline::test;
-using tessaline::files::ScopedSysCalls;
+using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
 
 namespace {
@@ -77,7 +79,7 @@ TEST(Unlink, FailedMembersAreReportedAndSkipped)
     TempDir dir;
     Put(dir / "t/stuck", "1");
     Put(dir / "t/free", "2");
-    ScopedSysCalls restore;
+    ScopedSysCalls restore(Sys());
     static const auto realUnlink = Sys().unlinkat;
     Sys().unlinkat = [](int directory, const char* name, int flags) {
         if (std::strcmp(name, "stuck") == 0) {
