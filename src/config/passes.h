@@ -5,6 +5,7 @@
 
 #include <cstdio>
 
+#include "config/class_lock.h"
 #include "tessaline/config/rvConfig.h"
 
 namespace tessaline::config {
@@ -29,8 +30,10 @@ char* SectionName(rvConfig& config, char* text);
 // *rest is the text behind the delimiter, or null when there is none.
 char* KeyOfLine(rvConfig& config, char* text, char** rest);
 
-// The writing pass of Flush; 1 when the file was replaced as asked.
-unsigned int WritePass(rvConfig& config);
+// The passes of Serialize. The writing pass consumes the tables; 1 when
+// the file was replaced as asked.
+void ReadPass(rvConfig& config) TESSALINE_REQUIRES(g_classLock);
+unsigned int WritePass(rvConfig& config) TESSALINE_REQUIRES(g_classLock);
 
 }  // namespace tessaline::config
 

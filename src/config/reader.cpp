@@ -11,37 +11,34 @@
 #include "tessaline/config/rvConfig.h"
 #include "util/sys.h"
 
-using tessaline::config::ScopedClassLock;
+namespace tessaline::config {
 
 namespace {
 
 constexpr int kOpenAttempts = 3;
 
 // The trim set " \t\n\r", tested without a call: Clean runs on every line.
-bool isTrimmed(char c)
+bool IsTrimmed(char c)
 {
     return c == ' ' || c == '\t' || c == '\n' || c == '\r';
 }
 
-FILE* openByMode(const char* name, rvConfig::OpenMode mode)
+FILE* OpenByMode(const char* name, rvConfig::OpenMode mode)
 {
-    namespace sys = tessaline::config::sys;
     switch (mode) {
     case rvConfig::OpenRead:
-        return sys::OpenStream(name, "re");
+        return Sys().fopen(name, "re");
     case rvConfig::OpenWrite:
-        return sys::OpenStream(name, "we");
+        return Sys().fopen(name, "we");
     case rvConfig::OpenUpdate: {
-        FILE* stream = sys::OpenStream(name, "r+e");
-        return stream != nullptr ? stream : sys::OpenStream(name, "w+e");
+        FILE* stream = Sys().fopen(name, "r+e");
+        return stream != nullptr ? stream : Sys().fopen(name, "w+e");
     }
     }
     return nullptr;
 }
 
 }  // namespace
-
-namespace tessaline::config {
 
 bool IsCommentLine(const char* text)
 {
@@ -77,19 +74,14 @@ bool ReadLine(FILE* stream, char* line)
     // Every use of the line is a C string, so only its first byte needs
     // clearing, not the whole buffer.
     line[0] = '\0';
-    return std::fgets(line, kLineLimit, stream) != nullptr;
+    return Sys().fgets(line, kLineLimit, stream) != nullptr;
 }
-
-}  // namespace tessaline::config
 
 namespace {
 
-using tessaline::config::KeyOfLine;
-using tessaline::config::ReadLine;
-
 // The value behind the delimiter: trimmed, then one opening quote removed
 // and the text cut at the last closing one. Null when nothing is stored.
-char* valueOfLine(rvConfig& config, char* rest)
+char* ValueOfLine(rvConfig& config, char* rest)
 {
     char* value = config.Clean(rest);
     if (*value == '\0') {
@@ -126,7 +118,7 @@ private:
     rvConfig::cfgStr m_slots[kSlots];
 };
 
-rvConfig::KeyTable& sectionKeys(rvConfig& config, const rvConfig::cfgStr& name)
+rvConfig::KeyTable& SectionKeys(rvConfig& config, const rvConfig::cfgStr& name) TESSALINE_REQUIRES(g_classLock)
 {
     rvConfig::SectionTable::iterator found = config.m_sections.find(name);
     if (found == config.m_sections.end()) {
@@ -135,28 +127,30 @@ rvConfig::KeyTable& sectionKeys(rvConfig& config, const rvConfig::cfgStr& name)
     return found->second;
 }
 
-void readPass(rvConfig& config)
+}  // namespace
+
+void ReadPass(rvConfig& config)
 {
     rvConfig::cfgStr running(config.m_strDefaultSection);
     config.Clear();
     config.m_strSection = config.m_strDefaultSection;
-    sectionKeys(config, config.m_strSection).clear();
+    SectionKeys(config, config.m_strSection).clear();
 
     // Only section lines and Section can change the section table between
     // key lines, so the running section is looked up once per block.
     rvConfig::KeyTable* keys = nullptr;
     KeyNames keyNames;
-    char line[tessaline::config::kLineBufferSize];
+    char line[kLineBufferSize];
     while (config.m_pFile != nullptr && !std::feof(config.m_pFile)) {
         if (!ReadLine(config.m_pFile, line)) {
             break;
         }
         char* text = config.Clean(line);
-        if (*text == '\0' || tessaline::config::IsCommentLine(text)) {
+        if (*text == '\0' || IsCommentLine(text)) {
             continue;
         }
-        if (tessaline::config::IsSectionLine(text)) {
-            const char* name = tessaline::config::SectionName(config, text);
+        if (IsSectionLine(text)) {
+            const char* name = SectionName(config, text);
             running = rvConfig::cfgStr(name);
             keys = nullptr;
             config.Section(name, 1);
@@ -167,12 +161,12 @@ void readPass(rvConfig& config)
         if (*key == '\0' || rest == nullptr) {
             continue;
         }
-        const char* value = valueOfLine(config, rest);
+        const char* value = ValueOfLine(config, rest);
         if (value == nullptr) {
             continue;
         }
         if (keys == nullptr) {
-            keys = &sectionKeys(config, running);
+            keys = &SectionKeys(config, running);
         }
         const std::pair<rvConfig::KeyTable::iterator, bool> added =
             keys->insert(rvConfig::KeyTable::value_type(keyNames.Get(key), rvConfig::cfgStr()));
@@ -185,18 +179,24 @@ void readPass(rvConfig& config)
     config.m_strSection = config.m_strDefaultSection;
 }
 
-}  // namespace
+}  // namespace tessaline::config
+
+using tessaline::config::IsTrimmed;
+using tessaline::config::kOpenAttempts;
+using tessaline::config::OpenByMode;
+using tessaline::config::ScopedClassLock;
+using tessaline::config::Sys;
 
 FILE* rvConfig::Open(const char* name, OpenMode mode)
 {
     if (m_pFile != nullptr) {
-        std::fclose(m_pFile);
+        Sys().fclose(m_pFile);
         m_pFile = nullptr;
     }
     if (name == nullptr) {
         return nullptr;
     }
-    for (int attempt = 1; (m_pFile = openByMode(name, mode)) == nullptr; ++attempt) {
+    for (int attempt = 1; (m_pFile = OpenByMode(name, mode)) == nullptr; ++attempt) {
         tessaline::util::PauseOneSecond();
         if (attempt == kOpenAttempts) {
             return nullptr;
@@ -222,7 +222,7 @@ unsigned int rvConfig::Load(const char* name, OpenMode mode)
 unsigned int rvConfig::Close(unsigned int bFlush)
 {
     if (m_pFile != nullptr) {
-        std::fclose(m_pFile);
+        Sys().fclose(m_pFile);
         m_pFile = nullptr;
     }
     if (bFlush != 0 && IsModified() != 0) {
@@ -231,12 +231,15 @@ unsigned int rvConfig::Close(unsigned int bFlush)
     return 1;
 }
 
+// Load and Flush hold the class lock already; a caller that runs a pass on
+// a stream of its own Open gets the same protection.
 unsigned int rvConfig::Serialize(unsigned int bWrite)
 {
+    ScopedClassLock lock;
     if (bWrite != 0) {
         return tessaline::config::WritePass(*this);
     }
-    readPass(*this);
+    tessaline::config::ReadPass(*this);
     return 0;
 }
 
@@ -246,11 +249,11 @@ char* rvConfig::Clean(char* text)
         return text;
     }
     char* start = text;
-    while (isTrimmed(*start)) {
+    while (IsTrimmed(*start)) {
         ++start;
     }
     char* end = start + std::strlen(start);
-    while (end > start && isTrimmed(end[-1])) {
+    while (end > start && IsTrimmed(end[-1])) {
         *--end = '\0';
     }
     return start;

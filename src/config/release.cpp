@@ -11,13 +11,15 @@
 
 #include <cstdlib>
 
+namespace tessaline::config {
+
 namespace {
 
 // Above the largest request glibc serves from its per-thread cache (1,032
 // bytes), which would answer it without looking at the fast lists.
 constexpr std::size_t kLargeRequest = 2048;
 
-void settleFreedBlocks()
+void SettleFreedBlocks()
 {
     // Volatile, so that the compiler keeps the pair it could otherwise drop.
     void* volatile block = std::malloc(kLargeRequest);
@@ -26,13 +28,11 @@ void settleFreedBlocks()
 
 }  // namespace
 
-namespace tessaline::config {
-
 void ReleaseKeys(rvConfig::SectionTable& sections)
 {
     for (rvConfig::SectionTable::iterator it = sections.begin(); it != sections.end(); ++it) {
         it->second.clear();
-        settleFreedBlocks();
+        SettleFreedBlocks();
     }
 }
 

@@ -2,7 +2,9 @@
 #include "config/side_name.h"
 #include "tessaline/files/rvFilename.h"
 
-std::string tessaline::config::SideFileName(const char* configName, const char* ext)
+namespace tessaline::config {
+
+std::string SideFileName(const char* configName, const char* ext)
 {
     rvFilename name(configName, 0);
     name.Ext(ext);
@@ -12,3 +14,5 @@ std::string tessaline::config::SideFileName(const char* configName, const char* 
     }
     return sideName;
 }
+
+}  // namespace tessaline::config

@@ -1,52 +1,67 @@
-// The configuration store's calls to the platform that can fail. Each
-// leaves errno as the failing call set it.
+// The platform calls of the configuration store, routed through one table so
+// that tests can make any of them fail on demand. The library reads the table
+// on every call; a test swaps entries under a testing::ScopedSysCalls
+// (tests/support/scoped_sys_calls.h). Not part of the installed interface.
+//
+// Each entry returns what the platform call returns and leaves its errno
+// untouched, so callers read the cause of a failure right after the call.
 #ifndef TESSALINE_SRC_CONFIG_SYS_H
 #define TESSALINE_SRC_CONFIG_SYS_H
 
 #include <cstddef>
 #include <cstdio>
 
-namespace tessaline::config::sys {
+#include <sys/stat.h>
+#include <sys/types.h>
 
-// fopen; the mode carries "e" for the library's own streams.
-FILE* OpenStream(const char* name, const char* mode);
+namespace tessaline::config {
+
+struct SysCalls {
+    FILE* (*fopen)(const char* path, const char* mode);
+    FILE* (*fdopen)(int fd, const char* mode);
+    // Every line the reading and the writing pass take from the old file.
+    char* (*fgets)(char* line, int size, FILE* stream);
+    // fwrite without the stream's lock: the temporary file is the writer's own.
+    size_t (*fwrite)(const void* data, size_t size, size_t count, FILE* stream);
+    int (*fflush)(FILE* stream);
+    int (*fclose)(FILE* stream);
+    int (*open)(const char* path, int flags, mode_t mode);
+    int (*close)(int fd);
+    int (*fsync)(int fd);
+    int (*fchmod)(int fd, mode_t mode);
+    int (*stat)(const char* path, struct stat* info);
+    int (*access)(const char* path, int mode);
+    int (*rename)(const char* from, const char* to);
+    int (*link)(const char* existing, const char* created);
+    int (*unlink)(const char* path);
+};
+
+// The live table. Tests reach it by linking the library's objects
+// statically; the shared object does not export it.
+SysCalls& Sys();
+
+namespace sys {
 
 // Creates `name` afresh for writing and reading, close-on-exec: a file or
 // symbolic link already standing there is removed first, and the open
 // refuses to follow or reuse one planted meanwhile. `mode` is that of
 // open(2), before the umask.
-FILE* CreateStream(const char* name, unsigned int mode);
-
-// The permission bits of `path` (following links); false if it cannot be
-// examined.
-bool PermissionBits(const char* path, unsigned int* bits);
-
-// fchmod of the stream's file.
-bool SetPermissionBits(FILE* stream, unsigned int bits);
-
-// access() with F_OK and W_OK.
-bool Exists(const char* path);
-bool Writable(const char* path);
+FILE* CreateStream(const char* name, mode_t mode);
 
 // Writes all of `text`; false on a short write.
-bool Write(FILE* stream, const char* text, std::size_t length, const char* name);
+bool Write(FILE* stream, const char* text, std::size_t length);
 
 // Flushes the stream, syncs the file to disk and closes it; false if any
 // step failed. The stream is closed in every case.
-bool CloseSynced(FILE* stream, const char* name);
+bool CloseSynced(FILE* stream);
 
 // Syncs the directory that holds `path`, so that a new name or a rename in
 // it is durable. Best effort: some file systems cannot sync a directory, and
 // the file itself is complete by then.
 void SyncDirectory(const char* path);
 
-int Rename(const char* from, const char* to);
-// A rename whose target exists and is replaced in one step.
-int Replace(const char* from, const char* to);
-// A second name for the file `from`.
-int Link(const char* from, const char* to);
-int Unlink(const char* path);
+}  // namespace sys
 
-}  // namespace tessaline::config::sys
+}  // namespace tessaline::config
 
 #endif

@@ -12,12 +12,16 @@
 using tessaline::config::BorrowedName;
 using tessaline::config::FindValue;
 
+namespace tessaline::config {
 namespace {
 
 // Room for the text of a number or a flag, terminator included.
 constexpr int kNumberBufferSize = 32;
 
 }  // namespace
+}  // namespace tessaline::config
+
+using tessaline::config::kNumberBufferSize;
 
 int rvConfig::GetValue(const char* key, int def, const char* section)
 {

@@ -1,97 +1,43 @@
 // Saving: Flush and the writing pass, which merges the tables into the old
-// file's lines and replaces the file by renaming.
-#include <cerrno>
+// file's lines and hands the result to the durable replacement.
 #include <cstdio>
 #include <cstring>
 #include <ctime>
 #include <string>
 
+#include <unistd.h>
+
 #include "config/borrowed_name.h"
 #include "config/class_lock.h"
 #include "config/passes.h"
-#include "config/side_name.h"
+#include "config/replacement.h"
 #include "config/sys.h"
 #include "tessaline/config/rvConfig.h"
 #include "tessaline/util/rvString.h"
-#include "util/error_text.h"
-#include "util/sys.h"
+#include "util/thread_annotations.h"
 
-using tessaline::config::ScopedClassLock;
-namespace sys = tessaline::config::sys;
+namespace tessaline::config {
 
 namespace {
 
-constexpr int kCreateAttempts = 3;
 constexpr std::size_t kTimeBufferSize = 128;
-constexpr unsigned int kFreshFileMode = 0666;
-constexpr unsigned int kOwnerOnly = 0600;
 
-// The temporary file. Every write is checked; after the first failure the
-// rest are skipped and the file is not used.
-class TempFile {
+// The merged text on its way into the temporary file.
+class Output {
 public:
-    explicit TempFile(std::string name) : m_name(std::move(name)), m_file(nullptr), m_good(true) {}
+    explicit Output(Replacement& file) : m_file(file) {}
 
-    ~TempFile()
-    {
-        if (m_file != nullptr) {
-            std::fclose(m_file);
-        }
-    }
-
-    TempFile(const TempFile&) = delete;
-    TempFile& operator=(const TempFile&) = delete;
-
-    // Creates the file afresh, never through a link planted at its name.
-    // It takes the permission bits of the file it will replace, so that a
-    // file kept from other users stays so; it is created owner-only until
-    // they are set. Without a file to replace it gets those of a new fopen.
-    bool Create(const char* configName)
-    {
-        unsigned int bits = 0;
-        const bool replacing = sys::PermissionBits(configName, &bits);
-        for (int attempt = 1; attempt <= kCreateAttempts; ++attempt) {
-            m_file = sys::CreateStream(m_name.c_str(), replacing ? kOwnerOnly : kFreshFileMode);
-            if (m_file != nullptr) {
-                if (replacing) {
-                    sys::SetPermissionBits(m_file, bits);
-                }
-                return true;
-            }
-            tessaline::util::PauseOneSecond();
-        }
-        return false;
-    }
-
-    void Put(const char* text) { Put(text, std::strlen(text)); }
-
-    void Put(const char* text, std::size_t length)
-    {
-        m_good = m_good && sys::Write(m_file, text, length, m_name.c_str());
-    }
+    void Put(const char* text) { m_file.Write(text, std::strlen(text)); }
 
     // One write per key line, through a buffer that keeps its capacity.
     void PutKey(const char* key, const char* value)
     {
         m_line.assign(key).append(" = ").append(value).append("\n");
-        Put(m_line.data(), m_line.size());
+        m_file.Write(m_line.data(), m_line.size());
     }
-
-    // Flushes, syncs and closes; true when everything reached the disk.
-    bool Finish()
-    {
-        FILE* file = m_file;
-        m_file = nullptr;
-        m_good = sys::CloseSynced(file, m_name.c_str()) && m_good;
-        return m_good;
-    }
-
-    const char* Name() const { return m_name.c_str(); }
 
 private:
-    std::string m_name;
-    FILE* m_file;
-    bool m_good;
+    Replacement& m_file;
     std::string m_line;
 };
 
@@ -111,7 +57,7 @@ private:
 
 // Writes the keys that the running section still holds, in table order,
 // and takes the section out of the table.
-void drain(rvConfig& config, TempFile& out, const rvConfig::cfgStr& running)
+void Drain(rvConfig& config, Output& out, const rvConfig::cfgStr& running) TESSALINE_REQUIRES(g_classLock)
 {
     const rvConfig::SectionTable::iterator section = config.m_sections.find(running);
     if (section != config.m_sections.end()) {
@@ -127,7 +73,7 @@ void drain(rvConfig& config, TempFile& out, const rvConfig::cfgStr& running)
     config.RemoveSection(running.c_str());
 }
 
-unsigned int sectionKeyCount(rvConfig& config, const rvConfig::cfgStr& name)
+unsigned int SectionKeyCount(rvConfig& config, const rvConfig::cfgStr& name) TESSALINE_REQUIRES(g_classLock)
 {
     const rvConfig::SectionTable::iterator section = config.m_sections.find(name);
     return section == config.m_sections.end() ? 0 : static_cast<unsigned int>(section->second.size());
@@ -135,10 +81,11 @@ unsigned int sectionKeyCount(rvConfig& config, const rvConfig::cfgStr& name)
 
 // A key line of the old file: written where it stands with the table's
 // value, or dropped when the table no longer holds the key.
-void mergeKeyLine(rvConfig& config, TempFile& out, char* text, const rvConfig::cfgStr& running)
+void MergeKeyLine(rvConfig& config, Output& out, char* text, const rvConfig::cfgStr& running)
+    TESSALINE_REQUIRES(g_classLock)
 {
     char* rest;
-    const char* key = tessaline::config::KeyOfLine(config, text, &rest);
+    const char* key = KeyOfLine(config, text, &rest);
     if (*key == '\0') {
         return;
     }
@@ -159,7 +106,7 @@ void mergeKeyLine(rvConfig& config, TempFile& out, char* text, const rvConfig::c
     if (section == config.m_sections.end()) {
         return;
     }
-    section->second.erase(tessaline::config::BorrowedName(key));
+    section->second.erase(BorrowedName(key));
     if (section->second.empty()) {
         // A copy: removing the current section may replace m_strSection.
         const rvConfig::cfgStr emptied = name;
@@ -169,40 +116,40 @@ void mergeKeyLine(rvConfig& config, TempFile& out, char* text, const rvConfig::c
 
 // Copies the old file's comments and blank lines, writes its keys with the
 // table's values, and drains each section at the next section line.
-void mergeOldLines(rvConfig& config, TempFile& out, rvConfig::cfgStr& running)
+void MergeOldLines(rvConfig& config, Output& out, rvConfig::cfgStr& running) TESSALINE_REQUIRES(g_classLock)
 {
     const std::size_t idLength = std::strlen(rvConfig::m_szIdString);
-    char line[tessaline::config::kLineBufferSize];
+    char line[kLineBufferSize];
     while (config.m_pFile != nullptr && !std::feof(config.m_pFile)) {
-        if (!tessaline::config::ReadLine(config.m_pFile, line)) {
+        if (!ReadLine(config.m_pFile, line)) {
             break;
         }
         char* text = config.Clean(line);
         if (*text == '\0') {
             out.Put(line);
-        } else if (tessaline::config::IsCommentLine(text)) {
+        } else if (IsCommentLine(text)) {
             if (_strnicmp(text, rvConfig::m_szIdString, static_cast<unsigned>(idLength)) != 0) {
                 out.Put(line);
                 out.Put("\n");
             }
-        } else if (tessaline::config::IsSectionLine(text)) {
-            const char* name = tessaline::config::SectionName(config, text);
+        } else if (IsSectionLine(text)) {
+            const char* name = SectionName(config, text);
             if (_stricmp(name, running.c_str()) != 0) {
-                drain(config, out, running);
+                Drain(config, out, running);
             }
             running = rvConfig::cfgStr(name);
-            if (config.Section(name, 0) != 0 && sectionKeyCount(config, running) != 0) {
+            if (config.Section(name, 0) != 0 && SectionKeyCount(config, running) != 0) {
                 out.Put("[");
                 out.Put(name);
                 out.Put("]\n");
             }
         } else {
-            mergeKeyLine(config, out, text, running);
+            MergeKeyLine(config, out, text, running);
         }
     }
 }
 
-void writeNewSections(rvConfig& config, TempFile& out)
+void WriteNewSections(rvConfig& config, Output& out) TESSALINE_REQUIRES(g_classLock)
 {
     for (rvConfig::SectionTable::iterator section = config.m_sections.begin(); section != config.m_sections.end();
          ++section) {
@@ -219,7 +166,7 @@ void writeNewSections(rvConfig& config, TempFile& out)
     }
 }
 
-void writeIdentificationLine(TempFile& out)
+void WriteIdentificationLine(Output& out)
 {
     const std::time_t now = std::time(nullptr);
     std::tm local;
@@ -232,101 +179,31 @@ void writeIdentificationLine(TempFile& out)
     out.Put(stamp);
 }
 
-void reportUnlinkFailure(const char* name)
-{
-    const int error = errno;
-    std::fprintf(stderr, "rvConfig: unlink(%s) failed: %s (%d).", name, tessaline::util::ErrorText(error), error);
-}
-
-// Replaces an existing file so that its name never stands empty: the old
-// file gets its backup name as a second link, and the temporary file is
-// renamed over it. False, with nothing changed but an earlier backup gone,
-// where a step is refused (a file system without hard links, say).
-bool replaceInOneStep(const char* configName, const char* tempName, const std::string& backupName)
-{
-    if (rvConfig::m_bBackups == 0) {
-        return sys::Replace(tempName, configName) == 0;
-    }
-    sys::Unlink(backupName.c_str());
-    if (sys::Link(configName, backupName.c_str()) != 0) {
-        return false;
-    }
-    if (sys::Replace(tempName, configName) != 0) {
-        sys::Unlink(backupName.c_str());
-        return false;
-    }
-    return true;
-}
-
-// Moves the old file aside (or removes it) and renames the temporary file
-// into its place, step by step, with a message for each failure. 1 when
-// the file was replaced as asked.
-unsigned int replaceInSteps(const char* configName, const char* tempName, const std::string& backupName,
-                            bool oldFileExists)
-{
-    unsigned int result = 1;
-    if (oldFileExists) {
-        if (rvConfig::m_bBackups != 0) {
-            sys::Unlink(backupName.c_str());
-            if (sys::Rename(configName, backupName.c_str()) != 0) {
-                std::fprintf(stderr, "Error creating backup config file %s: %s\n", configName, tessaline::util::ErrorText(errno));
-                result = 0;
-            }
-        } else if (sys::Unlink(configName) != 0) {
-            reportUnlinkFailure(configName);
-        }
-    }
-    if (sys::Rename(tempName, configName) != 0) {
-        const int error = errno;
-        std::fprintf(stderr, "rvConfig: rename(%s, %s) failed: %s (%d).", tempName, configName, tessaline::util::ErrorText(error),
-                     error);
-        // Without backups the old file is gone and the temporary file holds
-        // the only copy on disk: it stays.
-        if (rvConfig::m_bBackups != 0 && sys::Unlink(tempName) != 0) {
-            reportUnlinkFailure(tempName);
-        }
-        return 0;
-    }
-    return result;
-}
-
-// The one-step replacement where the file system allows it; else the
-// steps, which then give every message and result as if they had been
-// the only way.
-unsigned int replaceFile(const char* configName, const char* tempName)
-{
-    const std::string backupName = tessaline::config::SideFileName(configName, "bak");
-    const bool oldFileExists = sys::Exists(configName);
-    const unsigned int result = oldFileExists && replaceInOneStep(configName, tempName, backupName)
-                                    ? 1
-                                    : replaceInSteps(configName, tempName, backupName, oldFileExists);
-    sys::SyncDirectory(configName);
-    return result;
-}
-
 }  // namespace
 
-unsigned int tessaline::config::WritePass(rvConfig& config)
+unsigned int WritePass(rvConfig& config)
 {
     rvConfig::cfgStr running(config.m_strDefaultSection);
-    TempFile out(SideFileName(config.m_szConfigName, "new"));
-    if (!out.Create(config.m_szConfigName)) {
+    Replacement file(config.m_szConfigName);
+    if (!file.Create()) {
         return 0;
     }
+    Output out(file);
     if (config.m_pFile != nullptr) {
-        mergeOldLines(config, out, running);
+        MergeOldLines(config, out, running);
     }
     config.Close(0);
-    drain(config, out, running);
-    writeNewSections(config, out);
-    writeIdentificationLine(out);
-    if (!out.Finish()) {
-        sys::Unlink(out.Name());
-        return 0;
-    }
-    sys::SyncDirectory(out.Name());
-    return replaceFile(config.m_szConfigName, out.Name());
+    Drain(config, out, running);
+    WriteNewSections(config, out);
+    WriteIdentificationLine(out);
+    return file.Commit();
 }
+
+}  // namespace tessaline::config
+
+using tessaline::config::ScopedClassLock;
+using tessaline::config::Sys;
+using tessaline::config::TableRestorer;
 
 // The class lock covers the whole of Flush, not the writing pass alone:
 // two threads that flush one shared object would otherwise race on its
@@ -339,8 +216,8 @@ unsigned int rvConfig::Flush(unsigned int bClear)
         if (m_mode == OpenRead || m_szConfigName[0] == '\0') {
             return 0;
         }
-        if (sys::Exists(m_szConfigName)) {
-            if (!sys::Writable(m_szConfigName) || Open(m_szConfigName, m_mode) == nullptr) {
+        if (Sys().access(m_szConfigName, F_OK) == 0) {
+            if (Sys().access(m_szConfigName, W_OK) != 0 || Open(m_szConfigName, m_mode) == nullptr) {
                 return 0;
             }
         }

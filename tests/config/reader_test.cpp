@@ -1,6 +1,7 @@
 // Reading configuration files: the line format, sections and counting, the
 // open modes, and input that makes no sense.
-#include <chrono>
+#include <cerrno>
+#include <cstdio>
 #include <cstring>
 #include <random>
 #include <string>
@@ -9,9 +10,11 @@
 #include <fcntl.h>
 #include <gtest/gtest.h>
 
-#include "config/sys_seam.h"
+#include "config/sys.h"
 #include "config/temp_dir.h"
+#include "support/scoped_sys_calls.h"
 #include "tessaline/config/rvConfig.h"
+#include "util/sys.h"
 
 namespace {
 
@@ -269,7 +272,6 @@ TEST(RvConfigReader, BadInputIsReadWithoutHarm)
     EXPECT_STREQ(lookup(config, "c", "s"), "4");
 }
 
-// The only test that waits: three tries one second apart.
 TEST(RvConfigReader, FailedLoadKeepsEverything)
 {
     ConfigDir dir;
@@ -278,12 +280,16 @@ TEST(RvConfigReader, FailedLoadKeepsEverything)
     config.PutValue("mine", "1", "s");
     config.Mode(rvConfig::OpenUpdate);
     config.ConfigName("before.ini");
-    tessaline::config::testing::SetFaultHook([](tessaline::config::testing::SysCall, const char*) { return EACCES; });
-    const auto start = std::chrono::steady_clock::now();
-    EXPECT_EQ(config.Load(path.c_str(), rvConfig::OpenRead), 0u);
-    const auto waited = std::chrono::steady_clock::now() - start;
-    tessaline::config::testing::SetFaultHook(nullptr);
-    EXPECT_GE(waited, std::chrono::milliseconds(2900));
+    static long paused;
+    paused = 0;
+    {
+        tessaline::testing::ScopedSysCalls calls(tessaline::config::Sys());
+        tessaline::testing::ScopedSysCalls pauses(tessaline::util::Sys());
+        tessaline::config::Sys().fopen = [](const char*, const char*) -> FILE* { return errno = EACCES, nullptr; };
+        tessaline::util::Sys().nanosleep = [](const timespec* pause, timespec*) { return paused += pause->tv_sec, 0; };
+        EXPECT_EQ(config.Load(path.c_str(), rvConfig::OpenRead), 0u);
+    }
+    EXPECT_EQ(paused, 3);  // three tries one second apart
     EXPECT_STREQ(lookup(config, "mine", "s"), "1");
     EXPECT_EQ(config.IsModified(), 1u);
     EXPECT_STREQ(config.ConfigName(), "before.ini");
@@ -291,6 +297,16 @@ TEST(RvConfigReader, FailedLoadKeepsEverything)
     EXPECT_EQ(config.m_pFile, nullptr);
     // A null name fails without waiting.
     EXPECT_EQ(config.Open(nullptr, rvConfig::OpenRead), nullptr);
+    // A read error in the middle of the file ends the reading there.
+    {
+        tessaline::testing::ScopedSysCalls calls(tessaline::config::Sys());
+        tessaline::config::Sys().fgets = [](char* line, int size, FILE* stream) -> char* {
+            return std::ftell(stream) > 0 ? (errno = EIO, nullptr) : std::fgets(line, size, stream);
+        };
+        EXPECT_EQ(config.Load(dir.Write("two.ini", "a = 1\nb = 2\n").c_str(), rvConfig::OpenRead), 1u);
+    }
+    EXPECT_STREQ(lookup(config, "a", ""), "1");
+    EXPECT_EQ(lookup(config, "b", ""), nullptr);
 }
 
 }  // namespace

@@ -14,19 +14,21 @@
 
 #include <gtest/gtest.h>
 
-#include "config/sys_seam.h"
+#include "config/sys.h"
 #include "config/temp_dir.h"
 #include "config/written_text.h"
 #include "support/capture_stderr.h"
+#include "support/scoped_sys_calls.h"
 #include "tessaline/config/rvConfig.h"
+#include "util/sys.h"
 
 namespace {
 
-using tessaline::config::testing::FaultHook;
-using tessaline::config::testing::SetFaultHook;
-using tessaline::config::testing::SysCall;
+using tessaline::config::Sys;
+using tessaline::config::SysCalls;
 using tessaline::test::body;
 using tessaline::test::ConfigDir;
+using tessaline::testing::ScopedSysCalls;
 
 // Large enough that a limit of kFileSizeLimit bytes stops the write.
 std::string oldText(const char* value)
@@ -44,6 +46,35 @@ bool endsWith(const char* text, const char* tail)
 {
     const std::size_t length = std::strlen(text);
     return length >= std::strlen(tail) && std::strcmp(text + length - std::strlen(tail), tail) == 0;
+}
+
+const SysCalls kReal = Sys();
+
+int Fail(int error)
+{
+    errno = error;
+    return -1;
+}
+
+// Counted per flush: the first rename, the one over the old file, fails.
+int g_renames = 0;
+
+int FirstRenameFails(const char* from, const char* to)
+{
+    return g_renames++ == 0 ? Fail(EBUSY) : kReal.rename(from, to);
+}
+
+int TempFileRenameFails(const char* from, const char* to)
+{
+    return endsWith(from, ".new") ? Fail(EIO) : kReal.rename(from, to);
+}
+
+void FullDisk(SysCalls& sys)
+{
+    sys.fwrite = [](const void*, size_t, size_t, FILE*) -> size_t {
+        errno = ENOSPC;
+        return 0;
+    };
 }
 
 // A failure that the platform really gives, set up for one flush.
@@ -126,7 +157,7 @@ enum class Content { Absent, Old, New, Unchecked };
 struct FaultCase {
     const char* what;
     unsigned int backups;
-    FaultHook hook;
+    void (*fault)(SysCalls& sys);
     RealFault real;
     unsigned int result;
     // "{ini}", "{new}" stand for the paths of the file and the temporary file.
@@ -167,48 +198,54 @@ void expectContent(const ConfigDir& dir, const char* name, Content expected)
 TEST(RvConfigReplace, EveryFaultKeepsTheData)
 {
     const FaultCase cases[] = {
-        {"full disk", 0, [](SysCall call, const char*) { return call == SysCall::Write ? ENOSPC : 0; }, RealFault::None,
-         0, "", Content::Old, Content::Absent, Content::Absent},
-        {"full disk, backups on", 1, [](SysCall call, const char*) { return call == SysCall::Write ? ENOSPC : 0; },
+        {"full disk", 0, FullDisk, RealFault::None, 0, "", Content::Old, Content::Absent, Content::Absent},
+        {"full disk, backups on", 1, FullDisk, RealFault::None, 0, "", Content::Old, Content::Absent, Content::Absent},
+        {"fsync fails", 0, [](SysCalls& sys) { sys.fsync = [](int) { return Fail(EIO); }; }, RealFault::None, 0, "",
+         Content::Old, Content::Absent, Content::Absent},
+        {"close fails", 0,
+         [](SysCalls& sys) {
+             sys.fclose = [](FILE* stream) {
+                 kReal.fclose(stream);
+                 return Fail(EIO);
+             };
+         },
          RealFault::None, 0, "", Content::Old, Content::Absent, Content::Absent},
-        {"fsync fails", 0, [](SysCall call, const char*) { return call == SysCall::Sync ? EIO : 0; }, RealFault::None,
-         0, "", Content::Old, Content::Absent, Content::Absent},
-        {"close fails", 0, [](SysCall call, const char*) { return call == SysCall::Close ? EIO : 0; }, RealFault::None,
-         0, "", Content::Old, Content::Absent, Content::Absent},
         {"file size limit", 0, nullptr, RealFault::FileSizeLimit, 0, "", Content::Old, Content::Absent,
          Content::Absent},
         {"read-only directory", 1, nullptr, RealFault::ReadOnlyDirectory, 0, "", Content::Old, Content::Absent,
          Content::Absent},
         // The rename over the old file fails: the plain steps take over.
-        {"rename over the file fails", 0,
-         [](SysCall call, const char*) { return call == SysCall::Replace ? EBUSY : 0; }, RealFault::None, 1, "",
+        {"rename over the file fails", 0, [](SysCalls& sys) { sys.rename = FirstRenameFails; }, RealFault::None, 1, "",
          Content::New, Content::Absent, Content::Absent},
         {"rename over and unlink fail", 0,
-         [](SysCall call, const char*) { return call == SysCall::Replace || call == SysCall::Unlink ? EPERM : 0; },
+         [](SysCalls& sys) {
+             sys.rename = FirstRenameFails;
+             sys.unlink = [](const char* path) { return endsWith(path, ".ini") ? Fail(EPERM) : kReal.unlink(path); };
+         },
          RealFault::None, 1, "rvConfig: unlink({ini}) failed: Operation not permitted (1).", Content::New,
          Content::Absent, Content::Absent},
         // Without backups the temporary file then holds the only copy.
         {"every rename fails", 0,
-         [](SysCall call, const char*) { return call == SysCall::Replace || call == SysCall::Rename ? EIO : 0; },
-         RealFault::None, 0, "rvConfig: rename({new}, {ini}) failed: Input/output error (5).", Content::Absent,
-         Content::Absent, Content::New},
-        {"the temporary file cannot move, backups on", 1,
-         [](SysCall call, const char* from) {
-             return (call == SysCall::Replace || call == SysCall::Rename) && endsWith(from, ".new") ? EIO : 0;
-         },
+         [](SysCalls& sys) { sys.rename = [](const char*, const char*) { return Fail(EIO); }; }, RealFault::None, 0,
+         "rvConfig: rename({new}, {ini}) failed: Input/output error (5).", Content::Absent, Content::Absent,
+         Content::New},
+        {"the temporary file cannot move, backups on", 1, [](SysCalls& sys) { sys.rename = TempFileRenameFails; },
          RealFault::None, 0, "rvConfig: rename({new}, {ini}) failed: Input/output error (5).", Content::Absent,
          Content::Old, Content::Absent},
         {"the temporary file can neither move nor go", 1,
-         [](SysCall call, const char* from) {
-             const bool moveOrRemove = call == SysCall::Replace || call == SysCall::Rename || call == SysCall::Unlink;
-             return moveOrRemove && endsWith(from, ".new") ? EIO : 0;
+         [](SysCalls& sys) {
+             sys.rename = TempFileRenameFails;
+             // Only once written: the writer clears the name before it creates the file.
+             sys.unlink = [](const char* path) {
+                 return endsWith(path, ".new") && access(path, F_OK) == 0 ? Fail(EIO) : kReal.unlink(path);
+             };
          },
          RealFault::None, 0,
          "rvConfig: rename({new}, {ini}) failed: Input/output error (5)."
          "rvConfig: unlink({new}) failed: Input/output error (5).",
          Content::Absent, Content::Old, Content::New},
         // A file system without hard links: the backup is made by rename.
-        {"no hard links", 1, [](SysCall call, const char*) { return call == SysCall::Link ? EPERM : 0; },
+        {"no hard links", 1, [](SysCalls& sys) { sys.link = [](const char*, const char*) { return Fail(EPERM); }; },
          RealFault::None, 1, "", Content::New, Content::Old, Content::Absent},
         {"backup name is a directory", 1, nullptr, RealFault::BackupIsDirectory, 0,
          "Error creating backup config file {ini}: Is a directory\n", Content::New, Content::Unchecked,
@@ -228,10 +265,15 @@ TEST(RvConfigReplace, EveryFaultKeepsTheData)
                 std::printf("%s: not possible for this process, skipped\n", row.what);
                 continue;
             }
+            ScopedSysCalls calls(Sys());
+            ScopedSysCalls noPauses(tessaline::util::Sys());
+            tessaline::util::Sys().nanosleep = [](const timespec*, timespec*) { return 0; };
+            g_renames = 0;
+            if (row.fault != nullptr) {
+                row.fault(Sys());
+            }
             tessaline::test::CaptureStderr capture;
-            SetFaultHook(row.hook);
             result = config.Flush(0);
-            SetFaultHook(nullptr);
             messages = capture.Text();
         }
         rvConfig::m_bBackups = 0;

@@ -6,15 +6,16 @@
 
 #include <gtest/gtest.h>
 
-#include "config/sys_seam.h"
+#include <unistd.h>
+
+#include "config/sys.h"
 #include "config/temp_dir.h"
 #include "config/written_text.h"
+#include "support/scoped_sys_calls.h"
 #include "tessaline/config/rvConfig.h"
 
 namespace {
 
-using tessaline::config::testing::SetFaultHook;
-using tessaline::config::testing::SysCall;
 using tessaline::test::body;
 using tessaline::test::ConfigDir;
 using Change = std::function<void(rvConfig&)>;
@@ -208,9 +209,13 @@ TEST(RvConfigWriter, RefusalsLeaveEverything)
     config.PutValue("k", "2", "");
     EXPECT_EQ(config.Flush(1), 0u);
     config.Mode(rvConfig::OpenUpdate);
-    SetFaultHook([](SysCall call, const char*) { return call == SysCall::Writable ? EACCES : 0; });
-    EXPECT_EQ(config.Flush(1), 0u);
-    SetFaultHook(nullptr);
+    {
+        tessaline::testing::ScopedSysCalls calls(tessaline::config::Sys());
+        tessaline::config::Sys().access = [](const char* path, int mode) {
+            return mode == W_OK ? (errno = EACCES, -1) : access(path, mode);
+        };
+        EXPECT_EQ(config.Flush(1), 0u);
+    }
     EXPECT_EQ(dir.Read("app.ini"), "k = 1\n");
     EXPECT_EQ(config.IsModified(), 1u);
     EXPECT_EQ(config.Close(1), 1u);

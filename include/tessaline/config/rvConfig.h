@@ -22,11 +22,12 @@
  * operation says how long it stays valid.
  *
  * Thread safety: one recursive lock, m_mutex, serves all objects together.
- * Single lookups and stores, Clear, the removals, Load and the whole of
- * Flush hold it. Section, the enumerations and the counts do not, and the
- * string GetValue stores its result after the lock has gone: a caller that
- * shares one object between threads brackets such sequences with Lock() and
- * Unlock(), inside which the locked operations may still be called.
+ * Single lookups and stores, Clear, the removals, Load, Serialize and the
+ * whole of Flush hold it. Section, the enumerations and the counts do not,
+ * and the string GetValue stores its result after the lock has gone: a
+ * caller that shares one object between threads brackets such sequences with
+ * Lock() and Unlock(), inside which the locked operations may still be
+ * called.
  *
  * Typical use:
  * @code
@@ -438,7 +439,8 @@ public:
 
     /// 0 runs the reading pass on the open stream and gives 0; nonzero runs
     /// the writing pass of Flush (which consumes the tables) and gives 1 or
-    /// 0. Takes no lock of its own: use Load and Flush.
+    /// 0. Holds the class lock for the pass, as Load and Flush do around it;
+    /// use those.
     unsigned int Serialize(unsigned int bWrite);
 
     /// Trims blanks, tabs, CR and LF from both ends in place and returns the
