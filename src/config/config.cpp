@@ -5,12 +5,14 @@
 
 #include "config/borrowed_name.h"
 #include "config/class_lock.h"
+#include "config/config_name.h"
 #include "config/lookup.h"
 #include "config/release.h"
 #include "tessaline/config/rvConfig.h"
 #include "util/load_time.h"
 
 using tessaline::config::BorrowedName;
+using tessaline::config::kMaxConfigName;
 using tessaline::config::ScopedClassLock;
 
 const char* rvConfig::m_szCommentChars = "#;/";
@@ -20,14 +22,6 @@ const char* rvConfig::m_szIdString = "# Edited by Tessaline";
 const char* rvConfig::m_szDefaults = "defaults";
 unsigned int rvConfig::m_bBackups = 0;
 MMutex rvConfig::m_mutex TESSALINE_LOAD_TIME(MMutex_::MutexRecursive);
-
-namespace {
-
-// Longest name kept in m_szConfigName; the buffer's last two bytes are never
-// part of it.
-constexpr std::size_t kMaxConfigName = 4094;
-
-}  // namespace
 
 rvConfig::rvConfig()
 {

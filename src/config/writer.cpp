@@ -9,6 +9,7 @@
 
 #include "config/borrowed_name.h"
 #include "config/class_lock.h"
+#include "config/config_name.h"
 #include "config/passes.h"
 #include "config/replacement.h"
 #include "config/sys.h"
@@ -201,6 +202,7 @@ unsigned int WritePass(rvConfig& config)
 
 }  // namespace tessaline::config
 
+using tessaline::config::kMaxConfigName;
 using tessaline::config::ScopedClassLock;
 using tessaline::config::Sys;
 using tessaline::config::TableRestorer;
@@ -213,7 +215,10 @@ unsigned int rvConfig::Flush(unsigned int bClear)
 {
     ScopedClassLock lock;
     if (IsModified() != 0) {
-        if (m_mode == OpenRead || m_szConfigName[0] == '\0') {
+        // Every name longer than the limit was cut to it, and a cut name is
+        // another file.
+        const std::size_t nameLength = strnlen(m_szConfigName, kMaxConfigName);
+        if (m_mode == OpenRead || nameLength == 0 || nameLength == kMaxConfigName) {
             return 0;
         }
         if (Sys().access(m_szConfigName, F_OK) == 0) {

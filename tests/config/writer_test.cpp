@@ -1,11 +1,14 @@
 // Saving: the merge of table and old file, side files, and what each
 // failure leaves on disk and in memory.
 #include <cerrno>
+#include <filesystem>
+#include <fstream>
 #include <functional>
 #include <string>
 
 #include <gtest/gtest.h>
 
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "config/sys.h"
@@ -220,6 +223,24 @@ TEST(RvConfigWriter, RefusalsLeaveEverything)
     EXPECT_EQ(config.IsModified(), 1u);
     EXPECT_EQ(config.Close(1), 1u);
     EXPECT_EQ(body(dir.Read("app.ini")), "k = 2\n");
+
+    // A name of 4095 characters is kept cut to 4094, which names another
+    // file: Flush neither creates nor replaces anything.
+    std::string deep = dir.path();
+    while (deep.size() < 4089) {
+        const std::size_t room = 4088 - deep.size();
+        deep += "/" + std::string(room <= 255 ? room : 200, 'd');
+        ASSERT_EQ(mkdir(deep.c_str(), 0700), 0);
+    }
+    const std::string longName = deep + "/a.cfg";
+    std::ofstream(longName) << "k = 1\n";
+    rvConfig cut(longName.c_str(), rvConfig::OpenUpdate);
+    cut.PutValue("k", "2", "");
+    EXPECT_EQ(cut.Flush(0), 0u);
+    EXPECT_EQ(cut.IsModified(), 1u);
+    const auto listing = std::filesystem::directory_iterator(deep);
+    EXPECT_EQ(std::distance(begin(listing), end(listing)), 1);
+    EXPECT_EQ(dir.Read(longName.substr(dir.path().size() + 1)), "k = 1\n");
 }
 
 }  // namespace

@@ -261,7 +261,11 @@ public:
     /// to a temporary file beside the old one ("app.new" for "app.ini"),
     /// which then replaces it. Refuses (0, nothing touched) in OpenRead
     /// mode, without a ConfigName(), or when the file exists but is not
-    /// writable or cannot be opened.
+    /// writable or cannot be opened. It also refuses a ConfigName() of 4094
+    /// characters: every longer name was cut to that length, and a cut name
+    /// would send the text to another file (and replace that one). A name of
+    /// exactly 4094 characters is refused for the same reason, as it cannot
+    /// be told from a cut one.
     ///
     /// Guarantees (no data is lost):
     /// - A crash or a kill at any moment leaves a complete file under the
@@ -323,7 +327,8 @@ public:
     /// The text is the object's own array, never null.
     virtual const char* ConfigName();
     /// Keeps at most the first 4094 characters of `name`; null gives "".
-    /// `name` may be ConfigName() itself.
+    /// `name` may be ConfigName() itself. Flush never writes to a name of
+    /// that length, so a cut name is never written.
     virtual void ConfigName(const char* name);
 
     /// Makes `name` the current section if it exists (1), or creates it when
@@ -512,7 +517,7 @@ public:
     KeyTable::iterator m_itToken{nullptr, nullptr};
     ///@}
     /// The configuration file's name, NUL-terminated, at most 4094
-    /// characters.
+    /// characters; a longer name is kept cut, and never written by Flush.
     char m_szConfigName[4096] = {};
     /// Name of the default section.
     cfgStr m_strDefaultSection{m_szDefaults};
