@@ -16,3 +16,8 @@ libdir=$(ls -d "$prefix"/lib*/pkgconfig | head -n 1)
 export PKG_CONFIG_PATH=$libdir
 c++ -std=c++17 -o "$scratch/pc-host" "$host/host.cpp" $(pkg-config --cflags --libs tessaline)
 LD_LIBRARY_PATH=$(dirname "$libdir") "$scratch/pc-host"
+
+# The installed tool finds the installed library by itself.
+if [ -x "$prefix/bin/tessaline-config" ]; then
+  "$prefix/bin/tessaline-config" encrypt secret >/dev/null
+fi
