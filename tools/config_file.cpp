@@ -118,6 +118,7 @@ const char* ConfigFile::Find(const std::string& section, const std::string& key)
 
 void ConfigFile::Store(const std::string& section, const std::string& key, const std::string& value)
 {
+    CheckLineLength(key, Carried(value));
     m_config.PutValue(key.c_str(), value.c_str(), LibraryName(section).c_str());
 }
 

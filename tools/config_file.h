@@ -48,6 +48,8 @@ public:
     // until the next call of Find.
     const char* Find(const std::string& section, const std::string& key);
 
+    // Throws Failure(kUsage) for a line the reader would cut (see
+    // CheckLineLength).
     void Store(const std::string& section, const std::string& key, const std::string& value);
     void RemoveKey(const std::string& section, const std::string& key);
     void RemoveSection(const std::string& section);

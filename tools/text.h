@@ -15,9 +15,14 @@ void CheckOneLine(const std::string& text, const char* what);
 // Throw Failure(kUsage) for a key or section name that would read back as
 // something else: a key that is empty, starts a comment or section line,
 // holds the delimiter or has blanks at its ends; a section name with a
-// bracket or blanks at its ends. The section "" is the default section.
+// bracket, blanks at its ends or a header line longer than the reader
+// takes. The section "" is the default section.
 void CheckStorableKey(const std::string& key);
 void CheckStorableSection(const std::string& section);
+
+// Throws Failure(kUsage) when the line "key = value" would be longer than
+// the reader takes: it would read back cut, the rest as a line of its own.
+void CheckLineLength(const std::string& key, const std::string& carriedValue);
 
 // The text to store so that the reader gives back exactly `value`: the
 // reader trims values, removes one pair of quotes and forgets a key whose

@@ -64,6 +64,7 @@ check 1 '' "${E}app.ini: no key 'nope' in section 'net'"$'\n' set app.ini net no
 check 1 '' "${E}app.ini: no section 'nos'"$'\n' del app.ini nos --existing
 check 2 '' "${E}key 'a=b' cannot be stored: the file would read it back differently"$'\n' set app.ini s a=b 1
 check 2 '' "${E}section ' s' cannot be stored: the file would read it back differently"$'\n' set app.ini ' s' k 1
+check 2 '' "${E}the line of key 'k' would be longer than the file's 4094-byte limit"$'\n' set app.ini s k "$(printf '%4091s')"
 printf 'a\0b\n' >in.txt && in=in.txt
 check 2 '' "${E}the value holds a line break or NUL, which the file cannot carry"$'\n' set app.ini s k -
 in=/dev/null
