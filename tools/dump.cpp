@@ -1,5 +1,6 @@
 #include "dump.h"
 
+#include <cctype>
 #include <cstdio>
 #include <initializer_list>
 #include <string_view>
@@ -69,11 +70,11 @@ void AppendJsonString(const std::string& text, std::string& out)
 std::string ShellName(const std::string& section, const std::string& key)
 {
     std::string name = section + "_" + key;
+    // The tool keeps the C locale, so only ASCII letters and digits count.
     for (char& c : name) {
-        bool word = (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z') || (c >= '0' && c <= '9') || c == '_';
-        c = word ? c : '_';
+        c = std::isalnum(static_cast<unsigned char>(c)) != 0 ? c : '_';
     }
-    return name.front() >= '0' && name.front() <= '9' ? "_" + name : name;
+    return std::isdigit(static_cast<unsigned char>(name.front())) != 0 ? "_" + name : name;
 }
 
 std::string ShellQuoted(const std::string& text)

@@ -11,7 +11,7 @@ namespace tessaline::tools {
 namespace {
 
 constexpr char kBlanks[] = " \t";
-// The reader's line limit, line end included.
+// The reader takes lines of at most this many bytes, line end included.
 constexpr std::size_t kLongestLine = 4094;
 // What the writer puts between key and value.
 constexpr std::size_t kDelimiterWidth = 3;
@@ -64,14 +64,14 @@ void CheckStorableKey(const std::string& key)
 void CheckStorableSection(const std::string& section)
 {
     if (BlankAtAnEnd(section) || section.find_first_of(rvConfig::m_szSectionChars) != std::string::npos ||
-        section.size() + 2 > kLongestLine) {
+        section.size() + 3 > kLongestLine) {
         throw NotCarried("section", section);
     }
 }
 
 void CheckLineLength(const std::string& key, const std::string& carriedValue)
 {
-    if (key.size() + kDelimiterWidth + carriedValue.size() > kLongestLine) {
+    if (key.size() + kDelimiterWidth + carriedValue.size() + 1 > kLongestLine) {
         throw Failure{kUsage, "the line of key '" + key + "' would be longer than the file's " +
                                   std::to_string(kLongestLine) + "-byte limit"};
     }

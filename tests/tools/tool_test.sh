@@ -35,7 +35,7 @@ file_is() {
 }
 
 # Reading: names in any case, the section "", every format with its escapes.
-start $'# top\na = 1\n\n[Net]\nport = 80\nmsg = it\'s "x"\\\t\xc3\xa9\xff\n[2nd]\nk = v\n[empty]\n'
+start $'# top\na = 1\n\n[Net]\nport = 80\nmsg = it\'s "x"\\\t\xc3\xa9\xff\xe2\x82\xac\xe2\x82(\xc3(\n[9pm]\nk.v = v\n[empty]\n'
 check 0 $'80\n' '' get app.ini NET Port
 check 0 $'1\n' '' get app.ini '' a
 check 1 '' "${E}app.ini: no key 'nope' in section 'net'"$'\n' get app.ini net nope
@@ -43,13 +43,13 @@ check 1 '' "${E}app.ini: no section 'nos'"$'\n' get app.ini nos k
 check 0 $'x y\n' '' get --default 'x y' app.ini nos k
 check 3 '' "${E}missing.ini: No such file or directory"$'\n' get missing.ini s k
 check 3 '' "${E}.: Is a directory"$'\n' keys . s
-check 0 $'\nNet\nempty\n2nd\n' '' sections app.ini
+check 0 $'9pm\n\nNet\nempty\n' '' sections app.ini
 check 0 $'msg\nport\n' '' keys app.ini net
 check 1 '' "${E}app.ini: no section 'nos'"$'\n' keys app.ini nos
-check 0 $'a = 1\n[Net]\nmsg = it\'s "x"\\\t\xc3\xa9\xff\nport = 80\n[2nd]\nk = v\n' '' dump app.ini
-check 0 $'{\n  "": {\n    "a": "1"\n  },\n  "Net": {\n    "msg": "it\'s \\"x\\"\\\\\\u0009\xc3\xa9\\u00ff",\n    "port": "80"\n  },\n  "empty": {},\n  "2nd": {\n    "k": "v"\n  }\n}\n' '' dump app.ini --format json
-check 0 $'_a=\'1\'\nNet_msg=\'it\'\\\'\'s "x"\\\t\xc3\xa9\xff\'\nNet_port=\'80\'\n_2nd_k=\'v\'\n' '' dump app.ini --format sh
-check 0 $'[ 2nd ] k = v\n' '' dump app.ini 2ND --format lines
+check 0 $'a = 1\n[9pm]\nk.v = v\n[Net]\nmsg = it\'s "x"\\\t\xc3\xa9\xff\xe2\x82\xac\xe2\x82(\xc3(\nport = 80\n' '' dump app.ini
+check 0 $'{\n  "": {\n    "a": "1"\n  },\n  "9pm": {\n    "k.v": "v"\n  },\n  "Net": {\n    "msg": "it\'s \\"x\\"\\\\\\u0009\xc3\xa9\\u00ff\xe2\x82\xac\\u00e2\\u0082(\\u00c3(",\n    "port": "80"\n  },\n  "empty": {}\n}\n' '' dump app.ini --format json
+check 0 $'_a=\'1\'\n_9pm_k_v=\'v\'\nNet_msg=\'it\'\\\'\'s "x"\\\t\xc3\xa9\xff\xe2\x82\xac\xe2\x82(\xc3(\'\nNet_port=\'80\'\n' '' dump app.ini --format sh
+check 0 $'[ 9pm ] k.v = v\n' '' dump app.ini 9PM --format lines
 check 0 $'{\n  "empty": {}\n}\n' '' dump app.ini empty --format json
 untouched
 
@@ -64,7 +64,6 @@ check 1 '' "${E}app.ini: no key 'nope' in section 'net'"$'\n' set app.ini net no
 check 1 '' "${E}app.ini: no section 'nos'"$'\n' del app.ini nos --existing
 check 2 '' "${E}key 'a=b' cannot be stored: the file would read it back differently"$'\n' set app.ini s a=b 1
 check 2 '' "${E}section ' s' cannot be stored: the file would read it back differently"$'\n' set app.ini ' s' k 1
-check 2 '' "${E}the line of key 'k' would be longer than the file's 4094-byte limit"$'\n' set app.ini s k "$(printf '%4091s')"
 printf 'a\0b\n' >in.txt && in=in.txt
 check 2 '' "${E}the value holds a line break or NUL, which the file cannot carry"$'\n' set app.ini s k -
 in=/dev/null
@@ -76,18 +75,23 @@ check 0 '' "${E}app.ini: changed"$'\n' set --verbose app.ini net port 8080 --bac
 check 0 '' '' set app.ini '' top ' padded '
 check 0 '' '' set app.ini new empty ''
 check 0 '' '' set app.ini net hosts 'c, a' --list
+check 0 '' '' set app.ini net ports '80;81' --list --list-sep ' ; '
 check 0 '' '' set app.ini net -- key --dashes
-file_is app.ini $'# top\ntop = " padded "\n[net]\nport = 8080\nhosts = a, b, c\nkey = --dashes\n[new]\nempty = ""\n'
-[ "$(cat app.bak)" = "${text%$'\n'}" ] || fail "app.bak holds $(cat -A app.bak)"
+file_is app.ini $'# top\ntop = " padded "\n[net]\nport = 8080\nhosts = a, b, c\nports = 80 ; 81\nkey = --dashes\n[new]\nempty = ""\n'
 check 0 $' padded \n' '' get app.ini '' top
 check 0 $'\n' '' get app.ini new empty
 check 0 '' '' del app.ini net hosts a --list
 check 0 '' '' del app.ini net port
 check 0 '' '' del app.ini new
-file_is app.ini $'# top\ntop = " padded "\n[net]\nhosts = b, c\nkey = --dashes\n'
+file_is app.ini $'# top\ntop = " padded "\n[net]\nhosts = b, c\nports = 80 ; 81\nkey = --dashes\n'
+[ "$(cat app.bak)" = "${text%$'\n'}" ] || fail "app.bak holds $(cat -A app.bak)"
 check 0 '' '' del gone.ini s k
 [ ! -e gone.ini ] || fail "del created gone.ini"
 check 3 '' "${E}nodir/app.ini: No such file or directory"$'\n' set nodir/app.ini s k v
+long=$(printf '%4089s' | tr ' ' x)
+check 0 '' '' set long.ini s k "$long"
+check 0 "$long"$'\n' '' get long.ini s k
+check 2 '' "${E}the line of key 'k' would be longer than the file's 4094-byte limit"$'\n' set long.ini s k "x$long"
 
 # Secrets: the host's encrypted form, read from stdin, decrypted by get.
 secret=D9993EDEF413D2A604959413DB5571011372ECF3F7F1A671A98E6865722BD40CDEAB
@@ -121,6 +125,7 @@ check 2 '' "${E}get does not take --encrypt (try --help)"$'\n' get app.ini s k -
 check 2 '' "${E}--default needs a value (try --help)"$'\n' get app.ini s k --default
 check 2 '' "${E}missing arguments: tessaline-config get FILE SECTION KEY (try --help)"$'\n' get app.ini s
 check 2 '' "${E}del takes ITEM together with --list (try --help)"$'\n' del app.ini s k item
+check 2 '' "${E}--list-sep needs --list (try --help)"$'\n' set app.ini s k v --list-sep ';'
 check 2 '' "${E}unknown format 'xml' (try --help)"$'\n' dump app.ini --format xml
 check 0 "tessaline-config $version"$'\n' '' --version
 
