@@ -106,7 +106,8 @@ check 0 "$secret"$'\n' '' encrypt 'correct horse battery staple'
 echo "$secret" >in.txt && in=in.txt
 check 0 $'correct horse battery staple\n' '' decrypt -
 in=/dev/null
-check 1 '' "${E}not an encrypted value"$'\n' decrypt hello
+check 0 $'hi\n' '' decrypt "000000680169$(printf '%068d' 0)"
+check 1 '' "${E}not an encrypted value"$'\n' decrypt cafe
 
 # Merge: every key, or with --existing only those FILE has; OTHER from stdin.
 printf 'x = 1\n[db]\npw = clear\nhost = h\n' >other.ini
