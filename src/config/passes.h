@@ -15,8 +15,13 @@ constexpr int kLineBufferSize = 4096;
 constexpr int kLineLimit = 4095;
 
 // Reads the next line (or 4094-byte piece) into `line`; false at the end of
-// the file or on a read error.
+// the file, on a read error, or for a null stream.
 bool ReadLine(FILE* stream, char* line);
+
+// Whether the reading of `stream` stopped at a read error rather than at its
+// end. A stream open for writing only (OpenWrite) has no lines to give, and
+// its refused reads are no error.
+bool ReadFailed(FILE* stream);
 
 // Classes of a trimmed, non-empty line; a line that is neither is a key line.
 bool IsCommentLine(const char* text);

@@ -5,6 +5,8 @@
 #include <functional>
 #include <string_view>
 
+#include <stdio_ext.h>
+
 #include "config/class_lock.h"
 #include "config/passes.h"
 #include "config/sys.h"
@@ -74,7 +76,12 @@ bool ReadLine(FILE* stream, char* line)
     // Every use of the line is a C string, so only its first byte needs
     // clearing, not the whole buffer.
     line[0] = '\0';
-    return Sys().fgets(line, kLineLimit, stream) != nullptr;
+    return stream != nullptr && Sys().fgets(line, kLineLimit, stream) != nullptr;
+}
+
+bool ReadFailed(FILE* stream)
+{
+    return stream != nullptr && __freadable(stream) != 0 && Sys().ferror(stream) != 0;
 }
 
 namespace {

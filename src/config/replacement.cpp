@@ -91,6 +91,7 @@ Replacement::~Replacement()
 {
     if (m_file != nullptr) {
         Sys().fclose(m_file);
+        Sys().unlink(m_tempName.c_str());
     }
 }
 

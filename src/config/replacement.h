@@ -16,7 +16,8 @@ class Replacement {
 public:
     // For the file `configName`, which need not exist yet.
     explicit Replacement(const char* configName);
-    // A temporary file that was not committed is closed and stays.
+    // A temporary file that was not committed is closed and removed: the
+    // old file stands as it was.
     ~Replacement();
     Replacement(const Replacement&) = delete;
     Replacement& operator=(const Replacement&) = delete;

@@ -21,6 +21,7 @@ struct SysCalls {
     FILE* (*fdopen)(int fd, const char* mode);
     // Every line the reading and the writing pass take from the old file.
     char* (*fgets)(char* line, int size, FILE* stream);
+    int (*ferror)(FILE* stream);
     // fwrite without the stream's lock: the temporary file is the writer's own.
     size_t (*fwrite)(const void* data, size_t size, size_t count, FILE* stream);
     int (*fflush)(FILE* stream);

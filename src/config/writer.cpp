@@ -116,15 +116,13 @@ void MergeKeyLine(rvConfig& config, Output& out, char* text, const rvConfig::cfg
 }
 
 // Copies the old file's comments and blank lines, writes its keys with the
-// table's values, and drains each section at the next section line.
-void MergeOldLines(rvConfig& config, Output& out, rvConfig::cfgStr& running) TESSALINE_REQUIRES(g_classLock)
+// table's values, and drains each section at the next section line. False
+// when a read error cut the old file short.
+bool MergeOldLines(rvConfig& config, Output& out, rvConfig::cfgStr& running) TESSALINE_REQUIRES(g_classLock)
 {
     const std::size_t idLength = std::strlen(rvConfig::m_szIdString);
     char line[kLineBufferSize];
-    while (config.m_pFile != nullptr && !std::feof(config.m_pFile)) {
-        if (!ReadLine(config.m_pFile, line)) {
-            break;
-        }
+    for (bool more = ReadLine(config.m_pFile, line); more; more = ReadLine(config.m_pFile, line)) {
         char* text = config.Clean(line);
         if (*text == '\0') {
             out.Put(line);
@@ -148,6 +146,7 @@ void MergeOldLines(rvConfig& config, Output& out, rvConfig::cfgStr& running) TES
             MergeKeyLine(config, out, text, running);
         }
     }
+    return !ReadFailed(config.m_pFile);
 }
 
 void WriteNewSections(rvConfig& config, Output& out) TESSALINE_REQUIRES(g_classLock)
@@ -190,10 +189,13 @@ unsigned int WritePass(rvConfig& config)
         return 0;
     }
     Output out(file);
-    if (config.m_pFile != nullptr) {
-        MergeOldLines(config, out, running);
-    }
+    // The rest of a file cut short by a read error would be lost with its
+    // comments and layout: the old file stays instead.
+    const bool whole = MergeOldLines(config, out, running);
     config.Close(0);
+    if (!whole) {
+        return 0;
+    }
     Drain(config, out, running);
     WriteNewSections(config, out);
     WriteIdentificationLine(out);

@@ -244,6 +244,15 @@ TEST(RvConfigReplace, EveryFaultKeepsTheData)
          "rvConfig: rename({new}, {ini}) failed: Input/output error (5)."
          "rvConfig: unlink({new}) failed: Input/output error (5).",
          Content::Absent, Content::Old, Content::New},
+        // Merging only the lines before the error would lose the rest.
+        {"read error in the old file", 0,
+         [](SysCalls& sys) {
+             sys.fgets = [](char* line, int size, FILE* stream) -> char* {
+                 return std::ftell(stream) > 0 ? (errno = EIO, nullptr) : kReal.fgets(line, size, stream);
+             };
+             sys.ferror = [](FILE*) { return 1; };
+         },
+         RealFault::None, 0, "", Content::Old, Content::Absent, Content::Absent},
         // A file system without hard links: the backup is made by rename.
         {"no hard links", 1, [](SysCalls& sys) { sys.link = [](const char*, const char*) { return Fail(EPERM); }; },
          RealFault::None, 1, "", Content::New, Content::Old, Content::Absent},

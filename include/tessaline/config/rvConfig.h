@@ -285,6 +285,10 @@ public:
     ///   without a message. The directory is synced after the temporary file
     ///   is complete and after the replacement (best effort: not every file
     ///   system can).
+    /// - A read error in the old file fails the same way (0, the old file
+    ///   byte for byte, the temporary file removed, IsModified() still 1):
+    ///   merging only the lines before the error would lose the rest of its
+    ///   comments and layout.
     /// - The temporary file is created afresh: a file or symbolic link
     ///   already at its name is removed, never written through, and one
     ///   planted meanwhile makes the attempt fail (three attempts, one second
