@@ -14,9 +14,16 @@ constexpr int kLineBufferSize = 4096;
 // The fgets limit: at most 4094 bytes of the file per line.
 constexpr int kLineLimit = 4095;
 
+// The UTF-8 byte order mark that editors on other systems put first.
+constexpr char kByteOrderMark[] = "\xEF\xBB\xBF";
+
 // Reads the next line (or 4094-byte piece) into `line`; false at the end of
 // the file, on a read error, or for a null stream.
 bool ReadLine(FILE* stream, char* line);
+
+// Takes a byte order mark off the start of the file's first line, in place;
+// true when there was one. Anywhere else the three bytes are text.
+bool SkipByteOrderMark(char* line);
 
 // Whether the reading of `stream` stopped at a read error rather than at its
 // end. A stream open for writing only (OpenWrite) has no lines to give, and

@@ -79,6 +79,18 @@ bool ReadLine(FILE* stream, char* line)
     return stream != nullptr && Sys().fgets(line, kLineLimit, stream) != nullptr;
 }
 
+// The mark counts toward the 4094 bytes of the first piece.
+bool SkipByteOrderMark(char* line)
+{
+    const std::string_view mark(kByteOrderMark);
+    const std::string_view text(line);
+    if (text.substr(0, mark.size()) != mark) {
+        return false;
+    }
+    std::memmove(line, line + mark.size(), text.size() - mark.size() + 1);
+    return true;
+}
+
 bool ReadFailed(FILE* stream)
 {
     return stream != nullptr && __freadable(stream) != 0 && Sys().ferror(stream) != 0;
@@ -148,10 +160,9 @@ void ReadPass(rvConfig& config)
     rvConfig::KeyTable* keys = nullptr;
     KeyNames keyNames;
     char line[kLineBufferSize];
-    while (config.m_pFile != nullptr && !std::feof(config.m_pFile)) {
-        if (!ReadLine(config.m_pFile, line)) {
-            break;
-        }
+    bool more = ReadLine(config.m_pFile, line);
+    SkipByteOrderMark(line);
+    for (; more; more = ReadLine(config.m_pFile, line)) {
         char* text = config.Clean(line);
         if (*text == '\0' || IsCommentLine(text)) {
             continue;

@@ -122,7 +122,11 @@ bool MergeOldLines(rvConfig& config, Output& out, rvConfig::cfgStr& running) TES
 {
     const std::size_t idLength = std::strlen(rvConfig::m_szIdString);
     char line[kLineBufferSize];
-    for (bool more = ReadLine(config.m_pFile, line); more; more = ReadLine(config.m_pFile, line)) {
+    bool more = ReadLine(config.m_pFile, line);
+    if (SkipByteOrderMark(line)) {
+        out.Put(kByteOrderMark);
+    }
+    for (; more; more = ReadLine(config.m_pFile, line)) {
         char* text = config.Clean(line);
         if (*text == '\0') {
             out.Put(line);

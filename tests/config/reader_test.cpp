@@ -47,6 +47,7 @@ TEST(RvConfigReader, SingleLines)
         const char* value;
     } rows[] = {
         {"[ name ] tail", "name", nullptr, nullptr},
+        {"\xEF\xBB\xBF[name]", "name", nullptr, nullptr},  // a byte order mark: the first line only
         {"]name[", "name", nullptr, nullptr},
         {"[name", "name", nullptr, nullptr},
         {"[[name]]", "name", nullptr, nullptr},

@@ -86,6 +86,15 @@ TEST(RvConfigWriter, LayoutSurvives)
         // section is gone, its old key lines go too and never take a key of
         // the current section with the same name, which would then read back
         // in another section.
+        // A byte order mark opens the file again, before the keys drained
+        // ahead of the first section line; elsewhere it is text.
+        {"\xEF\xBB\xBF[main]\nport = 80\n",
+         [](rvConfig& c) {
+             c.PutValue("port", "81", "main");
+             c.PutValue("top", "1", "");
+         },
+         "\xEF\xBB\xBFtop = 1\n[main]\nport = 81\n"},
+        {"k = 1\n\xEF\xBB\xBFk = 2\n", none, "k = 1\n\xEF\xBB\xBFk = 2\n"},
         {"[]\nk = 1\n", none, "[]\nk = 1\n"},
         {"top = 1\n[]\nk = 1\n",
          [](rvConfig& c) {

@@ -237,7 +237,10 @@ public:
     /// stores into it, the first of two values for one key winning. Keys
     /// above the first section line go to DefaultSection(). A value in
     /// double quotes keeps its blanks. A line of more than 4094 bytes is
-    /// read as pieces of 4094, each a line of its own. A section line made
+    /// read as pieces of 4094, each a line of its own. A UTF-8 byte order
+    /// mark (EF BB BF) at the very start of the file is no part of the first
+    /// line (it counts toward that line's first 4094 bytes); anywhere else
+    /// the three bytes are text like any other. A section line made
     /// only of brackets ("[]", as the writer writes a section with the empty
     /// name) selects the section with the empty name. Afterwards the current
     /// section is the default section, which always exists. Nothing is
@@ -266,6 +269,10 @@ public:
     /// would send the text to another file (and replace that one). A name of
     /// exactly 4094 characters is refused for the same reason, as it cannot
     /// be told from a cut one.
+    ///
+    /// A file that began with a UTF-8 byte order mark begins with it again;
+    /// no other file gets one (nor a new file, nor one rewritten in
+    /// OpenWrite, whose old text is gone).
     ///
     /// Guarantees (no data is lost):
     /// - A crash or a kill at any moment leaves a complete file under the
