@@ -3,11 +3,13 @@
 #include "config/replacement.h"
 
 #include <cerrno>
+#include <climits>
 #include <cstdio>
 #include <string>
 
 #include <unistd.h>
 
+#include "config/final_target.h"
 #include "config/side_name.h"
 #include "config/sys.h"
 #include "tessaline/config/rvConfig.h"
@@ -82,9 +84,16 @@ unsigned int ReplaceInSteps(const char* configName, const char* tempName, const 
 
 }  // namespace
 
+// A name whose side files would pass the path limit is refused rather than
+// cut: a cut name is another file.
 Replacement::Replacement(const char* configName)
-    : m_configName(configName), m_tempName(SideFileName(configName, "new")), m_file(nullptr), m_good(true)
+    : m_named(FinalTarget(configName, m_configName)), m_file(nullptr), m_good(true)
 {
+    if (m_named) {
+        m_tempName = SideFileName(m_configName, "new");
+        m_backupName = SideFileName(m_configName, "bak");
+        m_named = m_tempName.size() < PATH_MAX && m_backupName.size() < PATH_MAX;
+    }
 }
 
 Replacement::~Replacement()
@@ -100,6 +109,9 @@ Replacement::~Replacement()
 // until they are set. Without a file to replace it gets those of a new fopen.
 bool Replacement::Create()
 {
+    if (!m_named) {
+        return false;
+    }
     struct stat old;
     const bool replacing = Sys().stat(m_configName.c_str(), &old) == 0;
     for (int attempt = 1; attempt <= kCreateAttempts; ++attempt) {
@@ -134,8 +146,8 @@ unsigned int Replacement::Commit()
     }
     const char* configName = m_configName.c_str();
     const char* tempName = m_tempName.c_str();
+    const std::string& backupName = m_backupName;
     sys::SyncDirectory(tempName);
-    const std::string backupName = SideFileName(configName, "bak");
     const bool oldFileExists = Sys().access(configName, F_OK) == 0;
     const unsigned int result = oldFileExists && ReplaceInOneStep(configName, tempName, backupName)
                                     ? 1

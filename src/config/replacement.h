@@ -14,7 +14,9 @@ namespace tessaline::config {
 
 class Replacement {
 public:
-    // For the file `configName`, which need not exist yet.
+    // For the file `configName`, which need not exist yet. Where the name is
+    // a symbolic link, or a chain of them, the file replaced is the one at
+    // the end of the chain, with the side files beside it; the links stay.
     explicit Replacement(const char* configName);
     // A temporary file that was not committed is closed and removed: the
     // old file stands as it was.
@@ -23,7 +25,10 @@ public:
     Replacement& operator=(const Replacement&) = delete;
 
     // Creates the temporary file afresh, three attempts one second apart;
-    // false, without a message, when all fail.
+    // false, without a message, when all fail. False
+    // at once, with nothing touched, when the chain of links cannot be
+    // followed to its end or the names of the file and its side files do not
+    // fit the path limit.
     bool Create();
 
     // Appends to the temporary file. After the first failed write the rest
@@ -36,8 +41,11 @@ public:
     unsigned int Commit();
 
 private:
+    // The file at the end of any links, and the names beside it.
     std::string m_configName;
     std::string m_tempName;
+    std::string m_backupName;
+    bool m_named;
     FILE* m_file;
     bool m_good;
 };

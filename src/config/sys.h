@@ -32,6 +32,7 @@ struct SysCalls {
     int (*fchmod)(int fd, mode_t mode);
     int (*stat)(const char* path, struct stat* info);
     int (*access)(const char* path, int mode);
+    ssize_t (*readlink)(const char* path, char* target, size_t size);
     int (*rename)(const char* from, const char* to);
     int (*link)(const char* existing, const char* created);
     int (*unlink)(const char* path);

@@ -1,6 +1,6 @@
 // A process that rewrites its configuration in a loop is killed at random
 // moments. Whatever the moment, a whole file, the old one or the new one,
-// stands under the configuration's name.
+// stands under the configuration's name, also where that name is a link.
 #include <chrono>
 #include <memory>
 #include <random>
@@ -8,6 +8,7 @@
 #include <thread>
 
 #include <signal.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -72,16 +73,26 @@ std::string body(const std::string& text)
     }
 }
 
-class CrashTest : public ::testing::TestWithParam<unsigned int> {
+struct Mode {
+    unsigned int backups;
+    bool behindALink;
+};
+
+class CrashTest : public ::testing::TestWithParam<Mode> {
 protected:
     void SetUp() override
     {
-        m_config = std::make_unique<rvConfig>(m_dir.Write("app.ini", initialFile()).c_str(), rvConfig::OpenUpdate);
+        if (GetParam().behindALink) {
+            ASSERT_EQ(mkdir(m_dir.Path("conf").c_str(), 0700), 0);
+            ASSERT_EQ(symlink("conf/app.ini", m_dir.Path("app.ini").c_str()), 0);
+        }
+        m_dir.Write(m_file, initialFile());
+        m_config = std::make_unique<rvConfig>(m_dir.Path("app.ini").c_str(), rvConfig::OpenUpdate);
         const auto start = std::chrono::steady_clock::now();
         for (int i = 0; i < kCalibrationRewrites; ++i) {
             storeSet(*m_config, i % 2);
             ASSERT_EQ(m_config->Flush(0), 1u);
-            m_sets[i % 2] = body(m_dir.Read("app.ini"));
+            m_sets[i % 2] = body(m_dir.Read(m_file));
         }
         m_rewriteTime = (std::chrono::steady_clock::now() - start) / kCalibrationRewrites;
         ASSERT_FALSE(m_sets[0].empty());
@@ -113,6 +124,9 @@ protected:
     }
 
     ConfigDir m_dir;
+    // The file itself, where the link leads.
+    const std::string m_file = GetParam().behindALink ? "conf/app.ini" : "app.ini";
+    const std::string m_backup = GetParam().behindALink ? "conf/app.bak" : "app.bak";
     // Loaded once; each child rewrites with its own copy.
     std::unique_ptr<rvConfig> m_config;
     std::string m_sets[2];
@@ -121,7 +135,7 @@ protected:
 
 TEST_P(CrashTest, KilledRewriteLeavesAWholeFileUnderItsName)
 {
-    const unsigned int backups = GetParam();
+    const unsigned int backups = GetParam().backups;
     const unsigned int seed = std::random_device()();
     SCOPED_TRACE("seed " + std::to_string(seed));
     std::mt19937 random(seed);
@@ -132,19 +146,20 @@ TEST_P(CrashTest, KilledRewriteLeavesAWholeFileUnderItsName)
         if (HasFatalFailure()) {
             return;
         }
-        ASSERT_TRUE(whole("app.ini")) << "after kill " << kills << ", " << m_dir.Read("app.ini").size()
-                                      << " bytes under the name";
-        if (backups != 0 && m_dir.Exists("app.bak")) {
-            ASSERT_TRUE(whole("app.bak")) << "after kill " << kills;
+        ASSERT_TRUE(whole(m_file)) << "after kill " << kills << ", " << m_dir.Read(m_file).size()
+                                   << " bytes under the name";
+        if (backups != 0 && m_dir.Exists(m_backup)) {
+            ASSERT_TRUE(whole(m_backup)) << "after kill " << kills;
         }
     }
     EXPECT_EQ(kills, kKillsPerMode) << "too slow: the time limit ended the test";
     RecordProperty("kills", kills);
 }
 
-INSTANTIATE_TEST_SUITE_P(Backups, CrashTest, ::testing::Values(0u, 1u),
-                         [](const ::testing::TestParamInfo<unsigned int>& info) {
-                             return info.param != 0 ? std::string("On") : std::string("Off");
+INSTANTIATE_TEST_SUITE_P(Backups, CrashTest, ::testing::Values(Mode{0, false}, Mode{1, false}, Mode{1, true}),
+                         [](const ::testing::TestParamInfo<Mode>& info) {
+                             return std::string(info.param.backups != 0 ? "On" : "Off") +
+                                    (info.param.behindALink ? "BehindALink" : "");
                          });
 
 }  // namespace

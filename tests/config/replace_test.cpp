@@ -1,8 +1,11 @@
 // Replacing the file on disk: every failure the platform can give, and a
 // directory that someone else can write to.
 #include <cerrno>
+#include <climits>
 #include <cstring>
 #include <string>
+#include <utility>
+#include <vector>
 
 #include <fcntl.h>
 #include <linux/fs.h>
@@ -329,6 +332,94 @@ TEST(RvConfigReplace, NothingIsWrittenThroughAPlantedTemporaryName)
         EXPECT_FALSE(elsewhere.Exists("created"));
         EXPECT_EQ(body(dir.Read("app.ini")), oldText("2"));
     }
+}
+
+std::string linkText(const std::string& path)
+{
+    char text[PATH_MAX];
+    const ssize_t length = readlink(path.c_str(), text, sizeof text);
+    return length < 0 ? "(no link)" : std::string(text, static_cast<std::size_t>(length));
+}
+
+int g_pauses = 0;
+
+TEST(RvConfigReplace, LinksLeadToTheFileAtTheirEnd)
+{
+    const struct {
+        const char* what;
+        // Link names and texts; "{dir}" is the directory's path, "{deep}" a
+        // directory below it that leaves room for a name of seven characters
+        // and no more.
+        std::vector<std::pair<std::string, std::string>> links;
+        std::string end;  // the file at the end of the chain
+        bool exists;
+        unsigned int result;
+        int pauses;
+    } rows[] = {
+        {"link", {{"app.ini", "conf/app.ini"}}, "conf/app.ini", true, 1, 0},
+        {"chain", {{"app.ini", "{dir}/conf/mid"}, {"conf/mid", "../real/app.ini"}}, "real/app.ini", true, 1, 0},
+        {"dangling", {{"app.ini", "conf/mid"}, {"conf/mid", "../real/app.ini"}}, "real/app.ini", false, 1, 0},
+        {"loop", {{"app.ini", "conf/mid"}, {"conf/mid", "../app.ini"}}, "app.ini", false, 0, 0},
+        {"no room for side files", {{"app.ini", "{dir}/{deep}/appfile"}}, "{deep}/appfile", true, 0, 0},
+        // Creating any file fails, as in a directory that is not writable.
+        {"target directory not writable", {{"app.ini", "conf/app.ini"}}, "conf/app.ini", true, 0, 3},
+    };
+    rvConfig::m_bBackups = 1;
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.what);
+        ConfigDir dir;
+        ASSERT_EQ(mkdir(dir.Path("conf").c_str(), 0700), 0);
+        ASSERT_EQ(mkdir(dir.Path("real").c_str(), 0700), 0);
+        const std::string deep = row.end.find("{deep}") == 0 ? dir.Deep(4087).substr(dir.path().size() + 1) : "";
+        const auto expand = [&dir, &deep](std::string text) {
+            for (const auto& [mark, path] :
+                 {std::pair<std::string, std::string>{"{dir}", dir.path()}, {"{deep}", deep}}) {
+                const std::size_t at = text.find(mark);
+                if (at != std::string::npos) {
+                    text.replace(at, mark.size(), path);
+                }
+            }
+            return text;
+        };
+        for (const auto& [name, text] : row.links) {
+            ASSERT_EQ(symlink(expand(text).c_str(), dir.Path(name).c_str()), 0);
+        }
+        const std::string end = expand(row.end);
+        const std::string stem = end.substr(0, end.find(".ini"));
+        if (row.exists) {
+            dir.Write(end, oldText("1"));
+        }
+        rvConfig config;
+        config.ConfigName(dir.Path("app.ini").c_str());
+        config.Mode(rvConfig::OpenUpdate);
+        config.PutValue("k", "2", "");
+        {
+            ScopedSysCalls calls(Sys());
+            ScopedSysCalls pauses(tessaline::util::Sys());
+            g_pauses = 0;
+            tessaline::util::Sys().nanosleep = [](const timespec*, timespec*) { return ++g_pauses, 0; };
+            if (row.pauses != 0) {
+                Sys().open = [](const char* path, int flags, mode_t mode) {
+                    return (flags & O_CREAT) != 0 ? Fail(EACCES) : kReal.open(path, flags, mode);
+                };
+            }
+            EXPECT_EQ(config.Flush(0), row.result);
+        }
+        EXPECT_EQ(g_pauses, row.pauses);
+        EXPECT_STREQ(config.ConfigName(), dir.Path("app.ini").c_str());
+        for (const auto& [name, text] : row.links) {
+            EXPECT_EQ(linkText(dir.Path(name)), expand(text)) << name;
+        }
+        EXPECT_FALSE(dir.Exists("app.new") || dir.Exists("app.bak") || dir.Exists(stem + ".new"));
+        if (row.result == 0) {
+            EXPECT_EQ(dir.Read(end), row.exists ? oldText("1") : "");
+            EXPECT_FALSE(dir.Exists(stem + ".bak"));
+        } else {
+            EXPECT_EQ(body(dir.Read(end)), row.exists ? oldText("2") : "k = 2\n");
+            EXPECT_EQ(dir.Read(stem + ".bak"), row.exists ? oldText("1") : "");
+        }
+    }
+    rvConfig::m_bBackups = 0;
 }
 
 mode_t modeOf(const std::string& path)

@@ -7,6 +7,7 @@
 #include <iterator>
 #include <string>
 
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "support/temp_dir.h"
@@ -22,6 +23,19 @@ public:
     {
         std::ofstream(Path(name), std::ios::binary) << content;
         return Path(name);
+    }
+
+    // A chain of new directories below this one whose path has `length`
+    // characters; that path.
+    std::string Deep(std::size_t length) const
+    {
+        std::string deep = path();
+        while (deep.size() < length) {
+            const std::size_t room = length - 1 - deep.size();
+            deep += "/" + std::string(room <= 255 ? room : 200, 'd');
+            EXPECT_EQ(mkdir(deep.c_str(), 0700), 0) << deep;
+        }
+        return deep;
     }
 
     // The whole file; "" when it is missing.

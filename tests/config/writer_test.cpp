@@ -8,7 +8,6 @@
 
 #include <gtest/gtest.h>
 
-#include <sys/stat.h>
 #include <unistd.h>
 
 #include "config/sys.h"
@@ -193,7 +192,10 @@ TEST(RvConfigWriter, BackupsNeverTakeTheFilesOwnName)
     const struct {
         const char* name;
         const char* backup;
-    } rows[] = {{"app.ini", "app.bak"}, {"app.new", "app.bak"}, {"app.bak", "app.bak.bak"}, {"new", "new.bak"}};
+    } rows[] = {
+        {"app.ini", "app.bak"}, {"app.new", "app.bak"},       {"app.bak", "app.bak.bak"},
+        {"new", "new.bak"},     {"a\\b.ini", "a\\b.ini.bak"},  // not "a/b.bak", in another directory
+    };
     rvConfig::m_bBackups = 1;
     for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
@@ -235,12 +237,7 @@ TEST(RvConfigWriter, RefusalsLeaveEverything)
 
     // A name of 4095 characters is kept cut to 4094, which names another
     // file: Flush neither creates nor replaces anything.
-    std::string deep = dir.path();
-    while (deep.size() < 4089) {
-        const std::size_t room = 4088 - deep.size();
-        deep += "/" + std::string(room <= 255 ? room : 200, 'd');
-        ASSERT_EQ(mkdir(deep.c_str(), 0700), 0);
-    }
+    const std::string deep = dir.Deep(4089);
     const std::string longName = deep + "/a.cfg";
     std::ofstream(longName) << "k = 1\n";
     rvConfig cut(longName.c_str(), rvConfig::OpenUpdate);

@@ -274,6 +274,20 @@ public:
     /// no other file gets one (nor a new file, nor one rewritten in
     /// OpenWrite, whose old text is gone).
     ///
+    /// Symbolic links: where ConfigName() is a link or a chain of links, the
+    /// file at the end of the chain is replaced and the links stay links
+    /// ("/etc/app.ini -> /srv/conf/app.ini" rewrites /srv/conf/app.ini). The
+    /// side files stand beside that file ("/srv/conf/app.new",
+    /// "/srv/conf/app.bak"), so the rename stays on its file system; a
+    /// relative link counts from the directory that holds it. ConfigName()
+    /// stays as given. A dangling link is a file that does not exist yet: it
+    /// is created at the link's final target. Refused at once (0, nothing
+    /// touched, no pause): a chain of more than 40 links (a loop), and a
+    /// target whose name, or a side file's, would pass the path limit of
+    /// 4095 characters. A target whose directory is not writable fails as
+    /// any unwritable directory: three attempts one second apart, then 0 with
+    /// the old file untouched.
+    ///
     /// Guarantees (no data is lost):
     /// - A crash or a kill at any moment leaves a complete file under the
     ///   configuration's name, the old one or the new one. The temporary
@@ -304,9 +318,12 @@ public:
     ///   0600 file stays 0600); a file that did not exist gets those of a new
     ///   fopen, 0666 less the umask. The owner is not carried over: the file
     ///   belongs to whoever rewrote it.
-    /// - Side-file names never equal the file's own name: where replacing
-    ///   the extension would give that name ("app.new", "app.bak"), the
-    ///   extension is appended ("app.new.new", "app.bak.bak").
+    /// - Side-file names never equal the file's own name and stand in its
+    ///   directory: where replacing the extension would give that name
+    ///   ("app.new", "app.bak"), or where the name does not come apart as a
+    ///   plain file name (it holds a backslash, which file names read as a
+    ///   directory separator), the extension is appended ("app.new.new",
+    ///   "app.bak.bak").
     /// - If the final rename fails with backups off, the old file is already
     ///   gone and the temporary file holds the only copy on disk: it is kept
     ///   under its name. With backups on, the old text is in the backup and
