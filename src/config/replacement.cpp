@@ -104,9 +104,13 @@ Replacement::~Replacement()
     }
 }
 
-// The temporary file takes the permission bits of the file it will replace,
-// so that a file kept from other users stays so; it is created owner-only
-// until they are set. Without a file to replace it gets those of a new fopen.
+// The temporary file takes the permission bits, owner and group of the file
+// it will replace, so that a file kept from other users stays so and a
+// service's file stays the service's after root rewrote it; it is created
+// owner-only until they are set. Where the process may not give the owner
+// and group away (it is not privileged, and the group is not its own), the
+// file stays the writer's, as any new file would be. Without a file to
+// replace it gets the mode of a new fopen.
 bool Replacement::Create()
 {
     if (!m_named) {
@@ -118,6 +122,8 @@ bool Replacement::Create()
         m_file = sys::CreateStream(m_tempName.c_str(), replacing ? kOwnerOnly : kFreshFileMode);
         if (m_file != nullptr) {
             if (replacing) {
+                // Owner first: a change of owner clears set-id bits.
+                Sys().fchown(fileno(m_file), old.st_uid, old.st_gid);
                 Sys().fchmod(fileno(m_file), old.st_mode & 07777);
             }
             return true;

@@ -24,8 +24,9 @@ public:
     Replacement(const Replacement&) = delete;
     Replacement& operator=(const Replacement&) = delete;
 
-    // Creates the temporary file afresh, three attempts one second apart;
-    // false, without a message, when all fail. False
+    // Creates the temporary file afresh, three attempts one second apart,
+    // with the mode, owner and group of the file it will replace where the
+    // process may give them; false, without a message, when all fail. False
     // at once, with nothing touched, when the chain of links cannot be
     // followed to its end or the names of the file and its side files do not
     // fit the path limit.

@@ -23,8 +23,8 @@ int StatPath(const char* path, struct stat* info)
 }
 
 SysCalls g_sys = {
-    ::fopen, ::fdopen, ::fgets,  ::ferror, ::fwrite_unlocked, ::fflush, ::fclose, OpenFile, ::close,
-    ::fsync, ::fchmod, StatPath, ::access, ::readlink,        ::rename, ::link,   ::unlink,
+    ::fopen, ::fdopen, ::fgets,  ::ferror, ::fwrite_unlocked, ::fflush,   ::fclose, OpenFile, ::close,
+    ::fsync, ::fchmod, ::fchown, StatPath, ::access,          ::readlink, ::rename, ::link,   ::unlink,
 };
 
 }  // namespace

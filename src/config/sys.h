@@ -30,6 +30,7 @@ struct SysCalls {
     int (*close)(int fd);
     int (*fsync)(int fd);
     int (*fchmod)(int fd, mode_t mode);
+    int (*fchown)(int fd, uid_t owner, gid_t group);
     int (*stat)(const char* path, struct stat* info);
     int (*access)(const char* path, int mode);
     ssize_t (*readlink)(const char* path, char* target, size_t size);

@@ -422,6 +422,36 @@ TEST(RvConfigReplace, LinksLeadToTheFileAtTheirEnd)
     rvConfig::m_bBackups = 0;
 }
 
+TEST(RvConfigReplace, RootKeepsTheOwnerWhereItMay)
+{
+    if (geteuid() != 0) {
+        GTEST_SKIP() << "only root can give a file to another user";
+    }
+    constexpr uid_t kOwner = 4242;
+    constexpr gid_t kGroup = 4343;
+    for (const bool refused : {false, true}) {
+        SCOPED_TRACE(refused ? "refused" : "permitted");
+        ConfigDir dir;
+        const std::string path = dir.Write("app.ini", oldText("1"));
+        ASSERT_EQ(chown(path.c_str(), kOwner, kGroup), 0);
+        ASSERT_EQ(chmod(path.c_str(), 0640), 0);
+        rvConfig config(path.c_str(), rvConfig::OpenUpdate);
+        config.PutValue("k", "2", "");
+        {
+            ScopedSysCalls calls(Sys());
+            if (refused) {
+                Sys().fchown = [](int, uid_t, gid_t) { return Fail(EPERM); };
+            }
+            EXPECT_EQ(config.Flush(0), 1u);
+        }
+        struct stat status;
+        ASSERT_EQ(stat(path.c_str(), &status), 0);
+        EXPECT_EQ(status.st_uid, refused ? 0 : kOwner);
+        EXPECT_EQ(status.st_gid, refused ? getegid() : kGroup);
+        EXPECT_EQ(status.st_mode & 07777, 0640u);
+    }
+}
+
 mode_t modeOf(const std::string& path)
 {
     struct stat status;

@@ -316,8 +316,11 @@ public:
     ///   apart, then 0 without a message).
     /// - The new file keeps the permission bits of the file it replaces (a
     ///   0600 file stays 0600); a file that did not exist gets those of a new
-    ///   fopen, 0666 less the umask. The owner is not carried over: the file
-    ///   belongs to whoever rewrote it.
+    ///   fopen, 0666 less the umask. It also keeps the owner and group where
+    ///   the process may give them: always when it is privileged (a service's
+    ///   file rewritten by root stays the service's), and the group when it
+    ///   owns the file and belongs to that group. Where it may not, the new
+    ///   file has the writer's owner and group, and Flush still succeeds.
     /// - Side-file names never equal the file's own name and stand in its
     ///   directory: where replacing the extension would give that name
     ///   ("app.new", "app.bak"), or where the name does not come apart as a
