@@ -6,6 +6,8 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <climits>
+#include <cstdlib>
 
 #include "failure.h"
 #include "text.h"
@@ -66,6 +68,15 @@ std::string DirectoryOf(const std::string& path)
         return ".";
     }
     return slash == 0 ? "/" : path.substr(0, slash);
+}
+
+// The file `path` names through any symbolic links; `path` itself when there
+// is none yet (a missing file, a dangling link: the library then finds the
+// link's final target on its own).
+std::string FinalName(const std::string& path)
+{
+    char resolved[PATH_MAX];
+    return realpath(path.c_str(), resolved) != nullptr ? std::string(resolved) : path;
 }
 
 }  // namespace
@@ -163,7 +174,8 @@ void ConfigFile::Save(bool backup, bool verbose)
     bool changed = m_config.IsModified() != 0;
     if (changed) {
         // Flush would retry a directory it cannot write to for three seconds.
-        if (access(DirectoryOf(m_name).c_str(), W_OK | X_OK) != 0) {
+        // It writes beside the file a symbolic link finally names.
+        if (access(DirectoryOf(FinalName(m_name)).c_str(), W_OK | X_OK) != 0) {
             throw FileError(m_name, SystemText(errno));
         }
         // The writer does not quote: without this, a value that came in

@@ -88,6 +88,9 @@ file_is app.ini $'# top\ntop = " padded "\n[net]\nhosts = b, c\nports = 80 ; 81\
 check 0 '' '' del gone.ini s k
 [ ! -e gone.ini ] || fail "del created gone.ini"
 check 3 '' "${E}nodir/app.ini: No such file or directory"$'\n' set nodir/app.ini s k v
+mkdir real && printf '[s]\nk = 1\n' >real/app.ini && ln -s real/app.ini link.ini
+check 0 '' '' set link.ini s k 2
+[ -L link.ini ] && file_is real/app.ini $'[s]\nk = 2\n' || fail "link.ini no longer a link to real/app.ini"
 long=$(printf '%4089s' | tr ' ' x)
 check 0 '' '' set long.ini s k "$long"
 check 0 "$long"$'\n' '' get long.ini s k
