@@ -3,14 +3,12 @@
 #include <cerrno>
 #include <ctime>
 
-#include "thread/guard_lock.h"
 #include "thread/mutex_record.h"
-#include "thread/relaxed.h"
+#include "thread/report.h"
+#include "thread/sys.h"
 #include "tessaline/thread/MThread.h"
 
-using tessaline::isTracked;
-using tessaline::MutexRecord;
-
+namespace tessaline::thread {
 namespace {
 
 constexpr int kTimedOut = -5;
@@ -19,13 +17,15 @@ constexpr long kMillisecondsPerSecond = 1000;
 // Clean-up of a waiter cancelled inside the platform wait, which has given
 // it the mutex back: the record must not go on naming a dead thread (a
 // checked mutex would refuse everyone for good), then the lock goes.
-void releaseCancelledWaiter(void* arg)
+void ReleaseCancelledWaiter(void* arg)
 {
     MMutex& mutex = *static_cast<MMutex*>(arg);
-    if (isTracked(mutex)) {
-        const MutexRecord record = tessaline::readRecord(mutex);
+    if (IsTracked(mutex)) {
+        HolderLock holder(mutex);
+        holder.AssertHeld();
+        const MutexRecord record = holder.Record();
         if (record.held == 1 && record.owner == static_cast<unsigned long>(pthread_self())) {
-            tessaline::writeRecord(mutex, MutexRecord{0, 0, 0});
+            holder.SetRecord(MutexRecord{0, 0, 0});
         }
     }
     MCondVar::Cleanup(&mutex.m_mutex);
@@ -33,7 +33,7 @@ void releaseCancelledWaiter(void* arg)
 
 // The deadline starts from the current whole second, so the wait may end up
 // to a second early; at least one second is added.
-timespec deadlineAfter(long timeout)
+timespec DeadlineAfter(long timeout)
 {
     const long seconds = timeout / kMillisecondsPerSecond;
     timespec deadline{};
@@ -41,7 +41,36 @@ timespec deadlineAfter(long timeout)
     return deadline;
 }
 
+// The platform wait on a mutex the caller holds. On 0 and ETIMEDOUT the
+// caller holds it again, and a tracked mutex's record is put back as it
+// entered: threads that passed through the mutex meanwhile have rewritten it.
+int WaitHolding(pthread_cond_t& cond, MMutex& mutex, long timeout)
+{
+    HolderLock holder(mutex);
+    holder.AssertHeld();
+    const bool tracked = IsTracked(mutex);
+    const MutexRecord saved = tracked ? holder.Record() : MutexRecord{};
+    int result = 0;
+    pthread_cleanup_push(ReleaseCancelledWaiter, &mutex);
+    if (timeout == 0) {
+        result = Sys().pthread_cond_wait(&cond, &mutex.m_mutex);
+    } else {
+        const timespec deadline = DeadlineAfter(timeout);
+        result = Sys().pthread_cond_timedwait(&cond, &mutex.m_mutex, &deadline);
+    }
+    if (tracked && (result == 0 || result == ETIMEDOUT)) {
+        holder.SetRecord(saved);
+    }
+    pthread_cleanup_pop(0);
+    return result;
+}
+
 }  // namespace
+}  // namespace tessaline::thread
+
+using tessaline::thread::Keep;
+using tessaline::thread::Report;
+using tessaline::thread::Sys;
 
 MCondVar_::MCondVar_() = default;
 
@@ -58,12 +87,10 @@ MCondVar::~MCondVar()
 
 int MCondVar::Create(int* err)
 {
-    int result = pthread_condattr_init(&m_attr);
-    StoreLastError(result);
-    CHECK_SYSERROR(result);
-    result = pthread_cond_init(&m_cond, &m_attr);
-    StoreLastError(result);
-    CHECK_SYSERROR(result);
+    Report(*this, Sys().pthread_condattr_init(&m_attr));
+    // The last result is reported twice: as it comes, and as the status.
+    const int result = Sys().pthread_cond_init(&m_cond, &m_attr);
+    Report(*this, result);
     if (err != nullptr) {
         *err = errno;
     }
@@ -74,50 +101,27 @@ int MCondVar::Wait(MMutex_& mutex, int* /*err*/, long timeout)
 {
     auto* target = dynamic_cast<MMutex*>(&mutex);
     if (target == nullptr) {
-        StoreLastError(EINVAL);
-        return CHECK_SYSERROR(EINVAL);
+        return Report(*this, EINVAL);
     }
     if (timeout < 0) {
-        StoreLastError(ETIMEDOUT);
-        return kTimedOut;
+        Keep(*this, ETIMEDOUT);
+        return tessaline::thread::kTimedOut;
     }
-    // The caller holds the lock, so the record is its own.
-    const bool tracked = isTracked(*target);
-    const MutexRecord saved = tracked ? tessaline::readRecord(*target) : MutexRecord{};
-    int result = 0;
-    pthread_cleanup_push(releaseCancelledWaiter, target);
-    if (timeout == 0) {
-        result = pthread_cond_wait(&m_cond, &target->m_mutex);
-    } else {
-        const timespec deadline = deadlineAfter(timeout);
-        result = pthread_cond_timedwait(&m_cond, &target->m_mutex, &deadline);
-    }
-    // Both outcomes give the lock back; threads that passed through the
-    // mutex meanwhile have rewritten the record, and this puts the waiter
-    // back in as holder with its own count.
-    if (tracked && (result == 0 || result == ETIMEDOUT)) {
-        tessaline::writeRecord(*target, saved);
-    }
-    pthread_cleanup_pop(0);
-    StoreLastError(result);
+    const int result = Keep(*this, tessaline::thread::WaitHolding(m_cond, *target, timeout));
     if (result == ETIMEDOUT) {
-        return kTimedOut;
+        return tessaline::thread::kTimedOut;
     }
-    return CHECK_SYSERROR(result);
+    return Report(*this, result);
 }
 
 int MCondVar::Broadcast(int* /*err*/)
 {
-    const int result = pthread_cond_broadcast(&m_cond);
-    StoreLastError(result);
-    return CHECK_SYSERROR(result);
+    return Report(*this, Sys().pthread_cond_broadcast(&m_cond));
 }
 
 int MCondVar::Signal(int* /*err*/)
 {
-    const int result = pthread_cond_signal(&m_cond);
-    StoreLastError(result);
-    return CHECK_SYSERROR(result);
+    return Report(*this, Sys().pthread_cond_signal(&m_cond));
 }
 
 MCondVar::operator pthread_cond_t() const

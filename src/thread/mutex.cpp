@@ -5,139 +5,137 @@
 #include "thread/guard_lock.h"
 #include "thread/mutex_record.h"
 #include "thread/relaxed.h"
+#include "thread/report.h"
+#include "thread/sys.h"
 #include "tessaline/thread/MThread.h"
 
-using tessaline::GuardLock;
-using tessaline::isTracked;
-using tessaline::loadRelaxed;
-using tessaline::MutexRecord;
-
+namespace tessaline::thread {
 namespace {
 
-// The refusals (2, 3, -2) all leave this code in m_lastError.
+// The refusals leave this code in m_lastError.
 constexpr int kRefused = -2;
+constexpr int kCheckedHeld = 2;
+constexpr int kNotHeld = 3;
 
-void storeErrno(int* err)
+void StoreErrno(int* err)
 {
     if (err != nullptr) {
         *err = errno;
     }
 }
 
-// Stores a platform result in m_lastError and hands it back. Callers decide
-// on the value they stored, never on a re-read of the shared field, which a
-// concurrent failure on another thread may already have overwritten.
-int record(MThreadError& object, int result)
+// The tail of Lock, Try and Unlock.
+int Finish(int result, int* err)
 {
-    tessaline::storeRelaxed(object.m_lastError, result);
-    return result;
-}
-
-// The tail of Lock, Try and Unlock. Success, by far the common case, needs no
-// call into the exported (and so interposable) reporting function.
-int finish(int result, int* err)
-{
-    storeErrno(err);
+    StoreErrno(err);
     return result == 0 ? 0 : CHECK_SYSERROR(result);
-}
-
-// The record's fields are read and written atomically: the holder changes
-// them without m_guard (below), while other threads look at them under it.
-void setRecord(MMutex& mutex, unsigned long owner, int count, int held)
-{
-    tessaline::storeRelaxed(mutex.m_owner, owner);
-    tessaline::storeRelaxed(mutex.m_count, count);
-    tessaline::storeRelaxed(mutex.m_held, held);
-    tessaline::storeRelaxed(mutex.m_locked, held);
-}
-
-// Only the holder ever finds its own identifier in m_owner: it writes it
-// after taking m_mutex and clears it before letting go. So the holder's own
-// steps (re-entry, release) are decided without m_guard, and no other thread
-// can see a record that the guard would have shown it differently.
-bool isHolder(const MMutex& mutex, unsigned long self)
-{
-    return loadRelaxed(mutex.m_owner) == self;
 }
 
 // Lock and Try of the recursive type: the holder re-enters and counts;
 // anyone else goes to m_mutex, where the record is free by the time it
 // succeeds.
-int lockRecursive(MMutex& mutex, int* err, bool blocking)
+int LockRecursive(MMutex& mutex, HolderLock& holder, int* err, bool blocking) TESSALINE_TRY_ACQUIRE(0, holder)
 {
     const unsigned long self = pthread_self();
-    if (isHolder(mutex, self)) {
-        tessaline::storeRelaxed(mutex.m_count, loadRelaxed(mutex.m_count) + 1);
+    if (IsHeldBy(mutex, self)) {
+        holder.AssertHeld();
+        holder.SetCount(holder.Record().count + 1);
         return 0;
     }
-    const int result = blocking ? pthread_mutex_lock(&mutex.m_mutex) : pthread_mutex_trylock(&mutex.m_mutex);
-    if (result == 0) {
-        setRecord(mutex, self, 1, 1);
+    int result = 0;
+    if (!holder.Acquire(blocking, result)) {
+        return Finish(Keep(mutex, result), err);
     }
-    record(mutex, result);
-    return finish(result, err);
+    holder.SetRecord(MutexRecord{self, 1, 1});
+    return Finish(Keep(mutex, 0), err);
 }
 
-// Lock and Try of the checked type. A free mutex is taken with trylock
-// inside the same guard section that reads the record, so the uncontended
-// case costs one guard round instead of two; trylock never blocks, so
-// holding m_guard across it keeps the lock order. Only when the platform
-// mutex is taken does the caller leave the guard and block on it. The record
-// still changes only after the platform mutex is held.
-int lockChecked(MMutex& mutex, int* err, bool blocking)
+// Lock and Try of the checked type. A free mutex is taken with trylock in the
+// same look that finds the record free, so the uncontended case costs one
+// guard round; trylock never blocks, so the lock order holds. Only when
+// m_mutex is taken does a Lock leave the guard and block on it.
+int LockChecked(MMutex& mutex, HolderLock& holder, int* err, bool blocking) TESSALINE_TRY_ACQUIRE(0, holder)
 {
     const unsigned long self = pthread_self();
-    int result;
+    RecordGuard guard(mutex);
+    int result = 0;
     {
-        GuardLock guard(mutex.m_guard);
-        if (loadRelaxed(mutex.m_held) == 1) {
+        GuardLock lock(guard);
+        if (guard.Held()) {
             mutex.StoreLastError(kRefused);
-            storeErrno(err);
-            return 2;
+            StoreErrno(err);
+            return kCheckedHeld;
         }
-        result = pthread_mutex_trylock(&mutex.m_mutex);
-        if (result == 0)
-            setRecord(mutex, self, 1, 1);
+        if (holder.Acquire(false, result)) {
+            holder.SetRecord(MutexRecord{self, 1, 1});
+            return Finish(Keep(mutex, 0), err);
+        }
     }
-    if (result != 0 && blocking) {
-        // The only blocking step; m_guard is not held across it.
-        result = pthread_mutex_lock(&mutex.m_mutex);
-        if (result == 0)
-            tessaline::writeRecord(mutex, MutexRecord{self, 1, 1});
+    if (!blocking) {
+        return Finish(Keep(mutex, result), err);
     }
-    record(mutex, result);
-    return finish(result, err);
+    if (!holder.Acquire(true, result)) {
+        return Finish(Keep(mutex, result), err);
+    }
+    holder.SetRecord(MutexRecord{self, 1, 1});
+    return Finish(Keep(mutex, 0), err);
 }
 
-int lockTracked(MMutex& mutex, int* err, bool blocking)
+int LockTracked(MMutex& mutex, int* err, bool blocking)
 {
-    return mutex.m_type == MMutex_::MutexRecursive ? lockRecursive(mutex, err, blocking)
-                                                   : lockChecked(mutex, err, blocking);
+    HolderLock holder(mutex);
+    return mutex.m_type == MMutex_::MutexRecursive ? LockRecursive(mutex, holder, err, blocking)
+                                                   : LockChecked(mutex, holder, err, blocking);
+}
+
+// The holder's last Unlock: the record goes free before m_mutex does.
+int ReleaseLast(HolderLock& holder) TESSALINE_RELEASE(holder)
+{
+    holder.SetRecord(MutexRecord{0, 0, 0});
+    return holder.Release();
+}
+
+// Unlock by the holder, who may have entered more than once.
+int UnlockAsHolder(MMutex& mutex, int* err)
+{
+    HolderLock holder(mutex);
+    holder.AssertHeld();
+    const int count = holder.Record().count - 1;
+    if (count > 0) {
+        holder.SetCount(count);
+        return Finish(Keep(mutex, 0), err);
+    }
+    return Finish(Keep(mutex, ReleaseLast(holder)), err);
+}
+
+// Unlock by a thread that is not the holder: 3 when nobody holds the mutex,
+// -2 when someone else does, who stays the holder.
+int RefuseUnlock(MMutex& mutex, int* err)
+{
+    RecordGuard guard(mutex);
+    GuardLock lock(guard);
+    mutex.StoreLastError(kRefused);
+    if (!guard.Held()) {
+        StoreErrno(err);
+        return kNotHeld;
+    }
+    return kRefused;
 }
 
 }  // namespace
+}  // namespace tessaline::thread
 
-namespace tessaline {
-
-MutexRecord readRecord(MMutex& mutex)
-{
-    GuardLock guard(mutex.m_guard);
-    return MutexRecord{loadRelaxed(mutex.m_owner), loadRelaxed(mutex.m_count), loadRelaxed(mutex.m_held)};
-}
-
-void writeRecord(MMutex& mutex, const MutexRecord& record)
-{
-    GuardLock guard(mutex.m_guard);
-    setRecord(mutex, record.owner, record.count, record.held);
-}
-
-}  // namespace tessaline
+using tessaline::thread::Finish;
+using tessaline::thread::Keep;
+using tessaline::thread::LoadRelaxed;
+using tessaline::thread::Report;
+using tessaline::thread::Sys;
 
 MMutex_::MMutex_() : m_type(MutexPlain), m_locked(0) {}
 
 int MMutex_::Locked() const
 {
-    return loadRelaxed(m_locked);
+    return LoadRelaxed(m_locked);
 }
 
 MMutex::MMutex(MMutex_::MutexType type) : m_attr(), m_mutex(), m_guard(), m_count(0), m_owner(0), m_held(0)
@@ -156,10 +154,11 @@ int MMutex::Create(MMutex_::MutexType type, int* /*err*/)
 {
     StoreLastError(0);
     m_type = type;
-    CHECK_SYSERROR(record(*this, pthread_mutexattr_init(&m_attr)));
-    CHECK_SYSERROR(record(*this, pthread_mutex_init(&m_mutex, &m_attr)));
-    const int result = record(*this, pthread_mutex_init(&m_guard, nullptr));
-    CHECK_SYSERROR(result);
+    Report(*this, Sys().pthread_mutexattr_init(&m_attr));
+    Report(*this, Sys().pthread_mutex_init(&m_mutex, &m_attr));
+    // The last result is reported twice: as it comes, and as the status.
+    const int result = Sys().pthread_mutex_init(&m_guard, nullptr);
+    Report(*this, result);
     m_count = 0;
     m_owner = 0;
     m_held = 0;
@@ -174,52 +173,36 @@ MMutex::operator pthread_mutex_t() const
 int MMutex::Lock(int* err)
 {
     if (m_type == MutexPlain) {
-        return finish(record(*this, pthread_mutex_lock(&m_mutex)), err);
+        return Finish(Keep(*this, Sys().pthread_mutex_lock(&m_mutex)), err);
     }
-    if (isTracked(*this)) {
-        return lockTracked(*this, err, true);
+    if (tessaline::thread::IsTracked(*this)) {
+        return tessaline::thread::LockTracked(*this, err, true);
     }
-    return finish(loadRelaxed(m_lastError), err);
+    return Finish(LoadRelaxed(m_lastError), err);
 }
 
 int MMutex::Try(int* err)
 {
-    StoreLastError(0);
+    Keep(*this, 0);
     if (m_type == MutexPlain) {
-        return finish(record(*this, pthread_mutex_trylock(&m_mutex)), err);
+        return Finish(Keep(*this, Sys().pthread_mutex_trylock(&m_mutex)), err);
     }
-    if (isTracked(*this)) {
-        return lockTracked(*this, err, false);
+    if (tessaline::thread::IsTracked(*this)) {
+        return tessaline::thread::LockTracked(*this, err, false);
     }
-    return finish(0, err);
+    return Finish(0, err);
 }
 
 int MMutex::Unlock(int* err)
 {
     if (m_type == MutexPlain) {
-        return finish(record(*this, pthread_mutex_unlock(&m_mutex)), err);
+        return Finish(Keep(*this, Sys().pthread_mutex_unlock(&m_mutex)), err);
     }
-    if (!isTracked(*this)) {
-        return finish(loadRelaxed(m_lastError), err);
+    if (!tessaline::thread::IsTracked(*this)) {
+        return Finish(LoadRelaxed(m_lastError), err);
     }
-    const unsigned long self = pthread_self();
-    if (isHolder(*this, self)) {
-        int result = 0;
-        const int count = loadRelaxed(m_count) - 1;
-        if (count > 0) {
-            tessaline::storeRelaxed(m_count, count);
-        } else {
-            setRecord(*this, 0, 0, 0);
-            result = pthread_mutex_unlock(&m_mutex);
-        }
-        return finish(record(*this, result), err);
+    if (tessaline::thread::IsHeldBy(*this, pthread_self())) {
+        return tessaline::thread::UnlockAsHolder(*this, err);
     }
-    // The refusals. m_owner cannot turn into the caller meanwhile.
-    GuardLock guard(m_guard);
-    StoreLastError(kRefused);
-    if (loadRelaxed(m_held) == 0) {
-        storeErrno(err);
-        return 3;
-    }
-    return -2;
+    return tessaline::thread::RefuseUnlock(*this, err);
 }

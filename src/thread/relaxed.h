@@ -5,20 +5,20 @@
 #ifndef TESSALINE_SRC_THREAD_RELAXED_H
 #define TESSALINE_SRC_THREAD_RELAXED_H
 
-namespace tessaline {
+namespace tessaline::thread {
 
 template <typename T>
-T loadRelaxed(const T& field)
+T LoadRelaxed(const T& field)
 {
     return __atomic_load_n(&field, __ATOMIC_RELAXED);
 }
 
 template <typename T, typename U>
-void storeRelaxed(T& field, U value)
+void StoreRelaxed(T& field, U value)
 {
     __atomic_store_n(&field, static_cast<T>(value), __ATOMIC_RELAXED);
 }
 
-}  // namespace tessaline
+}  // namespace tessaline::thread
 
 #endif

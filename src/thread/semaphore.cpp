@@ -2,20 +2,28 @@
 // report through errno.
 #include <cerrno>
 
+#include "thread/report.h"
+#include "thread/sys.h"
 #include "tessaline/thread/MThread.h"
 
+namespace tessaline::thread {
 namespace {
 
 // Below the platform's maximum on purpose: hosts rely on this limit.
 constexpr long kMaxCount = 32767;
 
 // The semaphore calls give -1 and set errno; turn that into the code.
-int codeOf(int result)
+int CodeOf(int result)
 {
     return result == -1 ? errno : result;
 }
 
 }  // namespace
+}  // namespace tessaline::thread
+
+using tessaline::thread::CodeOf;
+using tessaline::thread::Report;
+using tessaline::thread::Sys;
 
 MSemaphore_::MSemaphore_() = default;
 
@@ -34,26 +42,21 @@ MSemaphore::MSemaphore(long count, int shared) noexcept : m_shared(shared), m_se
 MSemaphore::~MSemaphore()
 {
     if (m_bInitialised) {
-        StoreLastError(codeOf(sem_destroy(&m_sem)));
+        StoreLastError(CodeOf(Sys().sem_destroy(&m_sem)));
     }
 }
 
 int MSemaphore::Init(long count)
 {
     if (m_bInitialised) {
-        sem_destroy(&m_sem);
+        Sys().sem_destroy(&m_sem);
         m_bInitialised = false;
     }
-    const long limited = count > kMaxCount ? kMaxCount : count;
-    int result = 0;
-    if (limited < 0) {
-        result = EINVAL;
-    } else {
-        result = codeOf(sem_init(&m_sem, m_shared, static_cast<unsigned int>(limited)));
-    }
+    const long limited = count > tessaline::thread::kMaxCount ? tessaline::thread::kMaxCount : count;
+    const int result =
+        limited < 0 ? EINVAL : CodeOf(Sys().sem_init(&m_sem, m_shared, static_cast<unsigned int>(limited)));
     m_bInitialised = result == 0;
-    StoreLastError(result);
-    return CHECK_SYSERROR(result);
+    return Report(*this, result);
 }
 
 int MSemaphore::Wait()
@@ -61,31 +64,26 @@ int MSemaphore::Wait()
     int result = EINVAL;
     if (m_bInitialised) {
         do {
-            result = codeOf(sem_wait(&m_sem));
+            result = CodeOf(Sys().sem_wait(&m_sem));
         } while (result == EINTR);
     }
-    StoreLastError(result);
-    return CHECK_SYSERROR(result);
+    return Report(*this, result);
 }
 
 int MSemaphore::Try()
 {
-    const int result = m_bInitialised ? codeOf(sem_trywait(&m_sem)) : EINVAL;
-    StoreLastError(result);
-    return CHECK_SYSERROR(result);
+    return Report(*this, m_bInitialised ? CodeOf(Sys().sem_trywait(&m_sem)) : EINVAL);
 }
 
 int MSemaphore::Signal()
 {
-    const int result = m_bInitialised ? codeOf(sem_post(&m_sem)) : EINVAL;
-    StoreLastError(result);
-    return CHECK_SYSERROR(result);
+    return Report(*this, m_bInitialised ? CodeOf(Sys().sem_post(&m_sem)) : EINVAL);
 }
 
 long MSemaphore::Count()
 {
     int value = 0;
-    if (!m_bInitialised || sem_getvalue(&m_sem, &value) != 0) {
+    if (!m_bInitialised || Sys().sem_getvalue(&m_sem, &value) != 0) {
         return -1;
     }
     return value;

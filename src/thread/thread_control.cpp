@@ -5,12 +5,14 @@
 #include <sched.h>
 
 #include "thread/relaxed.h"
+#include "thread/report.h"
 #include "thread/thread_state.h"
 #include "tessaline/thread/MThread.h"
 
-using tessaline::loadRelaxed;
-using tessaline::storeRelaxed;
-using tessaline::ThreadObjectLock;
+using tessaline::thread::Keep;
+using tessaline::thread::LoadRelaxed;
+using tessaline::thread::StoreRelaxed;
+using tessaline::thread::ThreadObjectLock;
 
 namespace {
 
@@ -44,8 +46,8 @@ int MThread::Once(void (*routine)(), int* control)
 unsigned long MThread::Self()
 {
     const unsigned long self = pthread_self();
-    ThreadObjectLock lock(*this);
-    storeRelaxed(m_thread, self);
+    ThreadObjectLock lock(*m_control);
+    StoreRelaxed(m_thread, self);
     return self;
 }
 
@@ -61,8 +63,8 @@ int MThread::Resume()
 
 void MThread::Cancel()
 {
-    StoreLastError(tessaline::requestCancel(*this));
-    storeRelaxed(m_cancelled, 1);
+    Keep(*this, tessaline::thread::RequestCancel(*m_control, *this));
+    StoreRelaxed(m_cancelled, 1);
     YieldThread();
 }
 
@@ -73,8 +75,7 @@ int MThread::Kill(int* err)
     // NOLINTNEXTLINE(cert-pos47-c,concurrency-thread-canceltype-asynchronous)
     pthread_setcanceltype(PTHREAD_CANCEL_ASYNCHRONOUS, nullptr);
     pthread_setcancelstate(PTHREAD_CANCEL_ENABLE, nullptr);
-    const int result = tessaline::requestCancel(*this);
-    StoreLastError(result);
+    const int result = Keep(*this, tessaline::thread::RequestCancel(*m_control, *this));
     YieldThread();
     if (err != nullptr) {
         *err = result;
@@ -91,12 +92,12 @@ MThread_::ThreadPriority MThread::Priority()
 
 bool MThread::Exists()
 {
-    ThreadObjectLock lock(*this);
-    const unsigned long target = loadRelaxed(m_thread);
+    ThreadObjectLock lock(*m_control);
+    const unsigned long target = LoadRelaxed(m_thread);
     return target != 0 && pthread_kill(target, 0) == 0;
 }
 
 MThread::operator unsigned long() const
 {
-    return loadRelaxed(m_thread);
+    return LoadRelaxed(m_thread);
 }

@@ -16,7 +16,8 @@ int CHECK_SYSERROR(int err)
     }
     // The line keeps its classic %d form; on LP64 that shows the low 32 bits
     // of the thread identifier.
-    std::fprintf(stderr, "Thread #%d error: %s (%d)\n", static_cast<int>(pthread_self()), tessaline::util::ErrorText(err), err);
+    std::fprintf(stderr, "Thread #%d error: %s (%d)\n", static_cast<int>(pthread_self()),
+                 tessaline::util::ErrorText(err), err);
     return -1;
 }
 

@@ -1,7 +1,12 @@
 // MThreadKey: one key of thread-specific data.
 #include <cerrno>
 
+#include "thread/report.h"
+#include "thread/sys.h"
 #include "tessaline/thread/MThread.h"
+
+using tessaline::thread::Report;
+using tessaline::thread::Sys;
 
 MThreadKey_::MThreadKey_() = default;
 
@@ -24,20 +29,17 @@ int MThreadKey::Create(void (*destructor)(), int, int*)
     // The classic signature takes an unprototyped routine; the platform calls
     // it with the thread's value.
     pthread_key_t key = 0;
-    const int result = pthread_key_create(&key, reinterpret_cast<void (*)(void*)>(destructor));
+    const int result = Sys().pthread_key_create(&key, reinterpret_cast<void (*)(void*)>(destructor));
     if (result == 0) {
         m_key = key;
         m_bHasKey = true;
     }
-    StoreLastError(result);
-    return CHECK_SYSERROR(result);
+    return Report(*this, result);
 }
 
 int MThreadKey::SetValue(void* value, int* /*err*/)
 {
-    const int result = m_bHasKey ? pthread_setspecific(m_key, value) : EINVAL;
-    StoreLastError(result);
-    return CHECK_SYSERROR(result);
+    return Report(*this, m_bHasKey ? Sys().pthread_setspecific(m_key, value) : EINVAL);
 }
 
 void* MThreadKey::GetValue(int* /*err*/)

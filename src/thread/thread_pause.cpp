@@ -7,8 +7,7 @@
 #include "tessaline/thread/MThread.h"
 #include "tessaline/util/rvTime.h"
 
-using tessaline::loadRelaxed;
-
+namespace tessaline::thread {
 namespace {
 
 constexpr int kPauseCancelled = -6;
@@ -20,7 +19,7 @@ constexpr long kNanosecondsPerSecond = 1000000000;
 // six seconds.
 constexpr uint32_t kSliceWholeSeconds = 5;
 
-uint32_t ticks()
+uint32_t Ticks()
 {
     return static_cast<uint32_t>(_gettickcount());
 }
@@ -57,7 +56,8 @@ public:
         until.tv_nsec = nanoseconds % kNanosecondsPerSecond;
         // A cancelled wait takes the mutex back before it unwinds; the guard
         // releases it on the way out.
-        tessaline::GuardLock lock(m_mutex);
+        PlatformMutex mutex(m_mutex);
+        GuardLock lock(mutex);
         while (pthread_cond_timedwait(&m_cond, &m_mutex, &until) == 0) {
         }
     }
@@ -68,24 +68,33 @@ private:
 };
 
 }  // namespace
+}  // namespace tessaline::thread
+
+using tessaline::thread::kMicrosecondsPerMillisecond;
+using tessaline::thread::kMicrosecondsPerSecond;
+using tessaline::thread::kPauseCancelled;
+using tessaline::thread::kSliceWholeSeconds;
+using tessaline::thread::LoadRelaxed;
+using tessaline::thread::SliceSleeper;
+using tessaline::thread::Ticks;
 
 int MThread::Cancelled(int* /*err*/, int milliseconds)
 {
     pthread_testcancel();
     // A negative length would wrap into a long pause near the counter's start.
-    if (loadRelaxed(m_cancelled) != 0 || milliseconds <= 0) {
-        return loadRelaxed(m_cancelled);
+    if (LoadRelaxed(m_cancelled) != 0 || milliseconds <= 0) {
+        return LoadRelaxed(m_cancelled);
     }
     // The tick counter is 32 bits wide; so is this arithmetic, wrap included.
-    const uint32_t end = ticks() + static_cast<uint32_t>(milliseconds) * kMicrosecondsPerMillisecond;
+    const uint32_t end = Ticks() + static_cast<uint32_t>(milliseconds) * kMicrosecondsPerMillisecond;
     SliceSleeper sleeper;
-    for (uint32_t now = ticks(); loadRelaxed(m_cancelled) == 0 && now < end; now = ticks()) {
+    for (uint32_t now = Ticks(); LoadRelaxed(m_cancelled) == 0 && now < end; now = Ticks()) {
         const uint32_t remaining = end - now;
         const uint32_t longest = kSliceWholeSeconds * kMicrosecondsPerSecond + remaining % kMicrosecondsPerSecond;
         sleeper.Sleep(remaining < longest ? remaining : longest);
         pthread_testcancel();
     }
-    return loadRelaxed(m_cancelled);
+    return LoadRelaxed(m_cancelled);
 }
 
 int MThread::Pause(int* err, int milliseconds)

@@ -37,6 +37,10 @@
 
 #include "tessaline/export.h"
 
+namespace tessaline::thread {
+class ThreadControl;
+}  // namespace tessaline::thread
+
 /// Passes a thread-library result through the reporting rule: 0 gives 0;
 /// ENOENT, ESRCH and EAGAIN give -1 silently; any other value, negative ones
 /// too, writes "Thread #%d error: %s (%d)\n" to stderr and gives -1. The
@@ -454,11 +458,11 @@ public:
  * waits for it with a timeout and joins it, Cancel asks it to stop, and the
  * routine itself can pause in a way that a Cancel ends (Pause, Cancelled).
  *
- * The object must outlive its thread: the thread uses it after the routine
- * returns, to mark it finished. Wait for a joinable thread before destroying
- * the object; a detached thread's object must stay until m_finished is 1 and
- * m_mutex has been taken and released once after that. One object starts
- * one thread.
+ * The object may be destroyed at any time, also while its thread runs: the
+ * destructor detaches a thread that nobody joined, and the thread, when its
+ * routine ends, no longer touches the object (m_finished and m_cancelled of
+ * a destroyed object are simply not written). The routine itself must not
+ * use an object it knows may be gone. One object starts one thread.
  *
  * Every created thread runs with all signals blocked but SIGKILL, and with
  * deferred cancellation: it ends at its next cancellation point (a sleep, a
@@ -492,9 +496,12 @@ public:
     /// pthread_once on `control` (an int set to 0 beforehand). Returns 0, or
     /// -1 with a line on stderr; a null `control` gives -1 (EINVAL).
     static int Once(void (*routine)(), int* control);
-    /// The start routine of every thread that Create starts.
+    /// Runs the object's routine with the wrapping that Create gives it (the
+    /// signal mask, deferred cancellation, m_finished, CancelThread) on the
+    /// calling thread. Create's threads run the same steps.
     static void* ThreadRoutineWrapper(MThread* thread);
-    /// The clean-up handler of a thread that is cancelled or calls Exit.
+    /// The clean-up step of a thread that is cancelled or calls Exit: marks
+    /// the MThread given cancelled and finished and detaches its thread.
     static void CancelThread(void* thread);
 
     /// An object without a thread, with a mutex and a condition of its own.
@@ -510,8 +517,10 @@ public:
     /// m_state, m_priority and m_lastError stay.
     virtual MThread& operator=(const MThread& other);
 
-    /// Detaches a created thread that nobody joined, then frees the mutex and
-    /// the condition. A thread adopted through Self is left alone.
+    /// Detaches a created thread that nobody joined (unless a Wait is joining
+    /// it) and lets go of the mutex and the condition, which a thread still
+    /// running keeps until its routine has ended. A thread adopted through
+    /// Self is left alone.
     ~MThread() override;
 
     /// Starts `routine(arg)` in a new thread through ThreadRoutineWrapper.
@@ -594,8 +603,11 @@ public:
     /// m_thread.
     operator unsigned long() const;
 
-    MCondVar* m_cond;           ///< Owned; signalled when the routine ends.
-    MMutex* m_mutex;            ///< Owned, MutexPlain; guards m_finished and the wait.
+    /// Signalled when the routine ends. Shared with the thread, which keeps
+    /// it past the object's end; never delete it.
+    MCondVar* m_cond;
+    /// MutexPlain; guards m_finished and the wait. Shared like m_cond.
+    MMutex* m_mutex;
     void* (*m_routine)(void*);  ///< The routine given to Create; null before.
     void* m_arg;                ///< Its argument.
     /// 1 once the routine has ended in any way.
@@ -608,13 +620,14 @@ public:
     /// signal.
     unsigned long m_thread;
 
-    /// The library's own: 1 while a Wait joins the thread, so that nothing
-    /// detaches it under the joiner. Guarded by m_mutex.
-    int m_joining;
-
     /// Made when the library loads, with a count of 64; nothing here waits on
     /// it or signals it.
     static MSemaphore m_thrdSemaphore;
+
+private:
+    // What the object shares with its thread, m_mutex and m_cond included;
+    // it lives until both are done with it.
+    tessaline::thread::ThreadControl* m_control;
 };
 
 #endif
