@@ -70,11 +70,8 @@ void MThread::Cancel()
 
 int MThread::Kill(int* err)
 {
-    // Kill's documented effect on the caller; the library's own locked spans
-    // hold cancellation off, so they stay safe under it.
-    // NOLINTNEXTLINE(cert-pos47-c,concurrency-thread-canceltype-asynchronous)
-    pthread_setcanceltype(PTHREAD_CANCEL_ASYNCHRONOUS, nullptr);
-    pthread_setcancelstate(PTHREAD_CANCEL_ENABLE, nullptr);
+    // The caller's own cancellation stays as it is: made asynchronous, a
+    // later cancel of the caller could land inside malloc or a lock.
     const int result = Keep(*this, tessaline::thread::RequestCancel(*m_control, *this));
     YieldThread();
     if (err != nullptr) {

@@ -180,9 +180,20 @@ TEST(MThread, KillDuringPauseEndsTheThreadThroughCancelThread)
     Pauser pauser(true);
     ASSERT_EQ(0, pauser.thread.Create(PauseLong, &pauser, 0, 0, 0, nullptr));
     ASSERT_EQ(0, pauser.started.Wait());
-    // Kill cancels asynchronously and spares the process.
+    // Kill ends the thread, spares the process and leaves the caller's own
+    // cancellation as it found it.
     int err = -1;
-    EXPECT_EQ(0, OnOtherThread([&] { return pauser.thread.Kill(&err); }));
+    EXPECT_EQ(0, OnOtherThread([&] {
+                  pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, nullptr);
+                  const int status = pauser.thread.Kill(&err);
+                  int state = -1;
+                  int type = -1;
+                  pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &state);
+                  pthread_setcanceltype(PTHREAD_CANCEL_DEFERRED, &type);
+                  EXPECT_EQ(PTHREAD_CANCEL_DISABLE, state);
+                  EXPECT_EQ(PTHREAD_CANCEL_DEFERRED, type);
+                  return status;
+              }));
     EXPECT_EQ(0, err);
     // 3 if Wait found the thread still there, -1 if it had already gone.
     const int status = pauser.thread.Wait(nullptr, nullptr, 0);

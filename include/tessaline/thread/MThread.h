@@ -556,12 +556,15 @@ public:
     /// on (m_cancelled is still set, for a routine that polls Cancelled).
     void Cancel() override;
 
-    /// Cancels like Cancel, after setting the *caller's* cancellation to
-    /// enabled and asynchronous (not restored). It never sends SIGKILL: on
-    /// Linux that signal ends the whole process, not one thread. Returns the
-    /// status of the cancel request; `err`, if given, receives its code.
-    /// Without a thread: -1 with ESRCH, silently. m_cancelled is not set here
-    /// but by the thread as it goes out through CancelThread.
+    /// Cancels like Cancel. The caller's own cancellation type and state are
+    /// left exactly as they were: an asynchronously cancellable host thread
+    /// could be cancelled inside malloc or while it holds a lock. The
+    /// target's cancellation is its own (deferred in a created thread). It
+    /// never sends SIGKILL: on Linux that signal ends the whole process, not
+    /// one thread. Returns the status of the cancel request; `err`, if given,
+    /// receives its code. Without a thread: -1 with ESRCH, silently.
+    /// m_cancelled is not set here but by the thread as it goes out through
+    /// CancelThread.
     int Kill(int* err) override;
 
     /// Waits for the thread and joins it. timeout in milliseconds, of the
