@@ -4,9 +4,10 @@
 
 #include "tessaline/util/HashToken.h"
 
+namespace tessaline::util {
 namespace {
 
-int exactSearch(const char* token, const _tokenHash* first, const _tokenHash* last)
+int ExactSearch(const char* token, const _tokenHash* first, const _tokenHash* last)
 {
     // The walk stops on the last row at the latest, and that row is tested
     // like every other.
@@ -17,7 +18,7 @@ int exactSearch(const char* token, const _tokenHash* first, const _tokenHash* la
     return _stricmp(row->name, token) == 0 ? row->value : -1;
 }
 
-int looseSearch(const char* token, _tokenHash* first, _tokenHash* end)
+int LooseSearch(const char* token, _tokenHash* first, _tokenHash* end)
 {
     const _tokenHash::LooseFindPred isPrefix;
     _tokenHash* const start = std::find_if(first, end, [&](const _tokenHash& row) { return isPrefix(row, token); });
@@ -42,6 +43,10 @@ int looseSearch(const char* token, _tokenHash* first, _tokenHash* end)
 }
 
 }  // namespace
+}  // namespace tessaline::util
+
+using tessaline::util::ExactSearch;
+using tessaline::util::LooseSearch;
 
 int HashToken(const char* token, _tokenHash* table, int high, int low, unsigned int exact)
 {
@@ -49,7 +54,7 @@ int HashToken(const char* token, _tokenHash* table, int high, int low, unsigned 
         return -1;
     }
     if (exact != 0) {
-        return exactSearch(token, table + low, table + high);
+        return ExactSearch(token, table + low, table + high);
     }
-    return looseSearch(token, table + low, table + high + 1);
+    return LooseSearch(token, table + low, table + high + 1);
 }

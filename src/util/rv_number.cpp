@@ -4,6 +4,7 @@
 
 #include "tessaline/util/rvString.h"
 
+namespace tessaline::util {
 namespace {
 
 constexpr int kMinRadix = 2;
@@ -12,7 +13,7 @@ constexpr int kMaxRadix = 36;
 // Writes `value` in `radix` (already checked) with an optional minus sign;
 // the digits come out last first and are reversed in place.
 template <typename Unsigned>
-char* writeDigits(Unsigned value, char* out, int radix, bool negative)
+char* WriteDigits(Unsigned value, char* out, int radix, bool negative)
 {
     char* p = out;
     if (negative) {
@@ -34,7 +35,7 @@ char* writeDigits(Unsigned value, char* out, int radix, bool negative)
 // A radix without meaning would divide by zero or never end: such a call
 // writes the empty string.
 template <typename Unsigned>
-char* toText(Unsigned value, char* out, int radix, bool negative)
+char* ToText(Unsigned value, char* out, int radix, bool negative)
 {
     if (out == nullptr) {
         return nullptr;
@@ -43,14 +44,14 @@ char* toText(Unsigned value, char* out, int radix, bool negative)
         out[0] = '\0';
         return out;
     }
-    return writeDigits(value, out, radix, negative);
+    return WriteDigits(value, out, radix, negative);
 }
 
 // Accumulates the decimal digits of `s`, skipping everything else, and
 // stops before a digit that makes `Accumulator` smaller. Unsigned arithmetic
 // wraps; the signed variant compares after converting back.
 template <typename Accumulator>
-Accumulator accumulateDigits(const char* s)
+Accumulator AccumulateDigits(const char* s)
 {
     Accumulator value = 0;
     for (; *s != '\0'; ++s) {
@@ -68,32 +69,36 @@ Accumulator accumulateDigits(const char* s)
 }
 
 }  // namespace
+}  // namespace tessaline::util
+
+using tessaline::util::AccumulateDigits;
+using tessaline::util::ToText;
 
 extern "C" {
 
 char* rv_itoa(int value, char* out, int radix)
 {
-    return toText(static_cast<std::uint32_t>(value), out, radix, radix == 10 && value < 0);
+    return ToText(static_cast<std::uint32_t>(value), out, radix, radix == 10 && value < 0);
 }
 
 char* rv_ltoa(long value, char* out, int radix)
 {
-    return toText(static_cast<unsigned long>(value), out, radix, radix == 10 && value < 0);
+    return ToText(static_cast<unsigned long>(value), out, radix, radix == 10 && value < 0);
 }
 
 char* rv_ultoa(unsigned long value, char* out, int radix)
 {
-    return toText(value, out, radix, false);
+    return ToText(value, out, radix, false);
 }
 
 char* _i64toa(long long value, char* out, int radix)
 {
-    return toText(static_cast<unsigned long long>(value), out, radix, radix == 10 && value < 0);
+    return ToText(static_cast<unsigned long long>(value), out, radix, radix == 10 && value < 0);
 }
 
 char* _ui64toa(unsigned long long value, char* out, int radix)
 {
-    return toText(value, out, radix, false);
+    return ToText(value, out, radix, false);
 }
 
 long long _atoi64(const char* s)
@@ -103,13 +108,13 @@ long long _atoi64(const char* s)
     }
     // Never negative: a step that would cross into the sign bit compares
     // smaller and ends the scan, so the negation cannot overflow.
-    const long long value = accumulateDigits<long long>(s);
+    const long long value = AccumulateDigits<long long>(s);
     return s[0] == '-' ? -value : value;
 }
 
 unsigned long long _atoui64(const char* s)
 {
-    return s == nullptr ? 0 : accumulateDigits<unsigned long long>(s);
+    return s == nullptr ? 0 : AccumulateDigits<unsigned long long>(s);
 }
 
 }  // extern "C"

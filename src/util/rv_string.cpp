@@ -6,21 +6,26 @@
 
 #include "tessaline/util/rvString.h"
 
+namespace tessaline::util {
 namespace {
 
-unsigned char lowered(char c)
+unsigned char Lowered(char c)
 {
     return rv_lowerTable[static_cast<unsigned char>(c)];
 }
 
 // The ctype functions are undefined for negative values other than EOF, so
 // a byte above 127 is passed as unsigned char.
-int byteOf(char c)
+int ByteOf(char c)
 {
     return static_cast<unsigned char>(c);
 }
 
 }  // namespace
+}  // namespace tessaline::util
+
+using tessaline::util::ByteOf;
+using tessaline::util::Lowered;
 
 extern "C" {
 
@@ -60,8 +65,8 @@ int _strnicmp(const char* a, const char* b, unsigned n)
 char* _strlwr(char* s)
 {
     for (char* p = s; p != nullptr && *p != '\0'; ++p) {
-        if (std::isupper(byteOf(*p))) {
-            *p = static_cast<char>(std::tolower(byteOf(*p)));
+        if (std::isupper(ByteOf(*p))) {
+            *p = static_cast<char>(std::tolower(ByteOf(*p)));
         }
     }
     return s;
@@ -70,8 +75,8 @@ char* _strlwr(char* s)
 char* _strupr(char* s)
 {
     for (char* p = s; p != nullptr && *p != '\0'; ++p) {
-        if (std::islower(byteOf(*p))) {
-            *p = static_cast<char>(std::toupper(byteOf(*p)));
+        if (std::islower(ByteOf(*p))) {
+            *p = static_cast<char>(std::toupper(ByteOf(*p)));
         }
     }
     return s;
@@ -84,10 +89,10 @@ char* _strstri(char* text, const char* pattern)
     }
     // The table test skips most positions without a call; an empty pattern
     // starts with NUL, which no position of the text equals.
-    const unsigned char first = lowered(pattern[0]);
+    const unsigned char first = Lowered(pattern[0]);
     const unsigned length = static_cast<unsigned>(std::strlen(pattern));
     for (char* p = text; *p != '\0'; ++p) {
-        if (lowered(*p) == first && _strnicmp(p, pattern, length) == 0) {
+        if (Lowered(*p) == first && _strnicmp(p, pattern, length) == 0) {
             return p;
         }
     }
@@ -99,7 +104,7 @@ char* _strrstri(char* text, const char* pattern)
     if (text == nullptr || pattern == nullptr) {
         return nullptr;
     }
-    int first = byteOf(pattern[0]);
+    int first = ByteOf(pattern[0]);
     if (std::isupper(first)) {
         first = std::tolower(first);
     }
@@ -111,7 +116,7 @@ char* _strrstri(char* text, const char* pattern)
         return nullptr;
     }
     for (char* p = text + (textLength - length - 1);; --p) {
-        if (lowered(*p) == first && _strnicmp(p, pattern, static_cast<unsigned>(length)) == 0) {
+        if (Lowered(*p) == first && _strnicmp(p, pattern, static_cast<unsigned>(length)) == 0) {
             return p;
         }
         if (p == text) {

@@ -4,18 +4,19 @@
 
 #include "tessaline/util/rvTime.h"
 
+namespace tessaline::util {
 namespace {
 
 constexpr long kSecondsPerHour = 3600;
 
 // Adds without the undefined behaviour of a signed overflow: an instant
 // near the limits of time_t wraps instead.
-time_t wrappingAdd(time_t a, long b)
+time_t WrappingAdd(time_t a, long b)
 {
     return static_cast<time_t>(static_cast<unsigned long>(a) + static_cast<unsigned long>(b));
 }
 
-time_t fromFields(int year, int month, int day, int hour, int minute, int second, int isDst)
+time_t FromFields(int year, int month, int day, int hour, int minute, int second, int isDst)
 {
     tm fields = {};
     fields.tm_year = year - 1900;
@@ -28,7 +29,7 @@ time_t fromFields(int year, int month, int day, int hour, int minute, int second
     return mktime(&fields);
 }
 
-char* formatInto(const tm* fields, const char* format, char* out, int size)
+char* FormatInto(const tm* fields, const char* format, char* out, int size)
 {
     if (out == nullptr || size < 1) {
         return out;
@@ -40,27 +41,33 @@ char* formatInto(const tm* fields, const char* format, char* out, int size)
 }
 
 }  // namespace
+}  // namespace tessaline::util
+
+using tessaline::util::FormatInto;
+using tessaline::util::FromFields;
+using tessaline::util::kSecondsPerHour;
+using tessaline::util::WrappingAdd;
 
 rvTime::rvTime(long value, bool isGmt) : m_time(value)
 {
     if (isGmt) {
         return;
     }
-    m_time = wrappingAdd(value, timezone);
+    m_time = WrappingAdd(value, timezone);
     const time_t local = value;
     tm fields;
     if (localtime_r(&local, &fields) != nullptr && fields.tm_isdst > 0) {
-        m_time = wrappingAdd(m_time, -kSecondsPerHour);
+        m_time = WrappingAdd(m_time, -kSecondsPerHour);
     }
 }
 
 rvTime::rvTime(int year, int month, int day, int hour, int minute, int second, int isDst)
-    : m_time(fromFields(year, month, day, hour, minute, second, isDst))
+    : m_time(FromFields(year, month, day, hour, minute, second, isDst))
 {
 }
 
 rvTime::rvTime(unsigned short dosDate, unsigned short dosTime, int isDst)
-    : m_time(fromFields(1980 + ((dosDate >> 9) & 0x7f), (dosDate >> 5) & 0x0f, dosDate & 0x1f, (dosTime >> 11) & 0x1f,
+    : m_time(FromFields(1980 + ((dosDate >> 9) & 0x7f), (dosDate >> 5) & 0x0f, dosDate & 0x1f, (dosTime >> 11) & 0x1f,
                         (dosTime >> 5) & 0x3f, 2 * (dosTime & 0x1f), isDst))
 {
 }
@@ -83,11 +90,11 @@ tm* rvTime::GetLocalTm(tm* out) const
 char* rvTime::Format(const char* format, char* out, int size) const
 {
     tm fields;
-    return formatInto(localtime_r(&m_time, &fields), format, out, size);
+    return FormatInto(localtime_r(&m_time, &fields), format, out, size);
 }
 
 char* rvTime::FormatGmt(const char* format, char* out, int size) const
 {
     tm fields;
-    return formatInto(gmtime_r(&m_time, &fields), format, out, size);
+    return FormatInto(gmtime_r(&m_time, &fields), format, out, size);
 }

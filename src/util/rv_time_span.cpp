@@ -4,6 +4,7 @@
 
 #include "tessaline/util/rvTime.h"
 
+namespace tessaline::util {
 namespace {
 
 constexpr long kSecondsPerMinute = 60;
@@ -11,12 +12,18 @@ constexpr long kSecondsPerHour = 3600;
 constexpr long kSecondsPerDay = 86400;
 
 // The difference without the undefined behaviour of a signed overflow.
-time_t wrappingDifference(time_t later, time_t earlier)
+time_t WrappingDifference(time_t later, time_t earlier)
 {
     return static_cast<time_t>(static_cast<unsigned long>(later) - static_cast<unsigned long>(earlier));
 }
 
 }  // namespace
+}  // namespace tessaline::util
+
+using tessaline::util::kSecondsPerDay;
+using tessaline::util::kSecondsPerHour;
+using tessaline::util::kSecondsPerMinute;
+using tessaline::util::WrappingDifference;
 
 char* rvTimeSpan::Format(const char* format, char* out, int) const
 {
@@ -60,8 +67,8 @@ void rvTimeSpan::Overlap(const rvTime& a1, const rvTime& a2, const rvTime& b1, c
 {
     const time_t firstEnd = std::min(a2.m_time, b2.m_time);
     if (a1.m_time >= b1.m_time) {
-        m_timeSpan = a1.m_time > b2.m_time ? 0 : wrappingDifference(firstEnd, a1.m_time);
+        m_timeSpan = a1.m_time > b2.m_time ? 0 : WrappingDifference(firstEnd, a1.m_time);
     } else {
-        m_timeSpan = a2.m_time < b1.m_time ? 0 : wrappingDifference(firstEnd, b1.m_time);
+        m_timeSpan = a2.m_time < b1.m_time ? 0 : WrappingDifference(firstEnd, b1.m_time);
     }
 }
