@@ -122,6 +122,33 @@ int RefuseUnlock(MMutex& mutex, int* err)
     return kRefused;
 }
 
+// Lock off the hot path: with `err`, or of a tracked or unknown type. Kept
+// out of line so that the hot path needs no stack frame of its own.
+__attribute__((noinline)) int LockOther(MMutex& mutex, int* err)
+{
+    if (mutex.m_type == MMutex_::MutexPlain) {
+        return Finish(Keep(mutex, Sys().pthread_mutex_lock(&mutex.m_mutex)), err);
+    }
+    if (IsTracked(mutex)) {
+        return LockTracked(mutex, err, true);
+    }
+    return Finish(LoadRelaxed(mutex.m_lastError), err);
+}
+
+__attribute__((noinline)) int UnlockOther(MMutex& mutex, int* err)
+{
+    if (mutex.m_type == MMutex_::MutexPlain) {
+        return Finish(Keep(mutex, Sys().pthread_mutex_unlock(&mutex.m_mutex)), err);
+    }
+    if (!IsTracked(mutex)) {
+        return Finish(LoadRelaxed(mutex.m_lastError), err);
+    }
+    if (IsHeldBy(mutex, pthread_self())) {
+        return UnlockAsHolder(mutex, err);
+    }
+    return RefuseUnlock(mutex, err);
+}
+
 }  // namespace
 }  // namespace tessaline::thread
 
@@ -170,15 +197,18 @@ MMutex::operator pthread_mutex_t() const
     return m_mutex;
 }
 
+// Lock and Unlock of a plain mutex without `err` are the hot path: one
+// platform call and the store of its result, with nothing live across the
+// call but the object. The store is what costs against a bare platform
+// call: it keeps the call from being a tail call, and the extra frame, not
+// the work, is most of the difference.
 int MMutex::Lock(int* err)
 {
-    if (m_type == MutexPlain) {
-        return Finish(Keep(*this, Sys().pthread_mutex_lock(&m_mutex)), err);
+    if (m_type == MutexPlain && err == nullptr) {
+        const int result = Keep(*this, Sys().pthread_mutex_lock(&m_mutex));
+        return result == 0 ? 0 : CHECK_SYSERROR(result);
     }
-    if (tessaline::thread::IsTracked(*this)) {
-        return tessaline::thread::LockTracked(*this, err, true);
-    }
-    return Finish(LoadRelaxed(m_lastError), err);
+    return tessaline::thread::LockOther(*this, err);
 }
 
 int MMutex::Try(int* err)
@@ -195,14 +225,9 @@ int MMutex::Try(int* err)
 
 int MMutex::Unlock(int* err)
 {
-    if (m_type == MutexPlain) {
-        return Finish(Keep(*this, Sys().pthread_mutex_unlock(&m_mutex)), err);
+    if (m_type == MutexPlain && err == nullptr) {
+        const int result = Keep(*this, Sys().pthread_mutex_unlock(&m_mutex));
+        return result == 0 ? 0 : CHECK_SYSERROR(result);
     }
-    if (!tessaline::thread::IsTracked(*this)) {
-        return Finish(LoadRelaxed(m_lastError), err);
-    }
-    if (tessaline::thread::IsHeldBy(*this, pthread_self())) {
-        return tessaline::thread::UnlockAsHolder(*this, err);
-    }
-    return tessaline::thread::RefuseUnlock(*this, err);
+    return tessaline::thread::UnlockOther(*this, err);
 }

@@ -43,7 +43,8 @@ struct SysCalls {
 
 // Defined in sys.cpp and constant-initialised, so the table is complete
 // before any load-time object of the library is built.
-extern SysCalls g_sysCalls;
+// Hidden, so the library reads it without a detour through the GOT.
+extern SysCalls g_sysCalls __attribute__((visibility("hidden")));
 
 // The live table. Inline: the plain mutex's lock and unlock read it on every
 // call. Tests reach it by linking the library's objects statically; the

@@ -1,16 +1,20 @@
 #include <cerrno>
+#include <ctime>
 #include <string>
 #include <thread>
 
 #include <gtest/gtest.h>
 
 #include "support/capture_stderr.h"
+#include "support/scoped_sys_calls.h"
 #include "tessaline/tessaline.h"
+#include "thread/sys.h"
 #include "thread/thread_test_support.h"
 
 using tessaline::test::CaptureStderr;
 using tessaline::test::OnOtherThread;
-using tessaline::test::SecondsFor;
+using tessaline::testing::ScopedSysCalls;
+using tessaline::thread::Sys;
 
 namespace {
 
@@ -28,35 +32,39 @@ bool FreeElsewhere(MMutex& mutex)
 
 }  // namespace
 
-TEST(MCondVar, TimeoutsHaveAWholeSecondGrainAndEndHoldingTheMutex)
+TEST(MCondVar, TimeoutsHaveAWholeSecondGrainFromTheCurrentSecond)
 {
+    static timespec deadline;
+    static int calls;
+    ScopedSysCalls restore(Sys());
+    Sys().pthread_cond_timedwait = [](pthread_cond_t*, pthread_mutex_t*, const timespec* until) {
+        deadline = *until;
+        ++calls;
+        return ETIMEDOUT;
+    };
     struct Case {
-        MMutex_::MutexType type;
         long timeout;
-        double atLeast, atMost;
+        long seconds;  // added to the current second; -1: no wait at all
     };
-    const Case cases[] = {
-        // Upper bounds sit halfway to the next whole second: a loaded
-        // machine wakes late, but never a whole second late.
-        {MMutex_::MutexPlain, 1, 0, 1.5},
-        {MMutex_::MutexPlain, 1999, 0, 1.5},
-        {MMutex_::MutexRecursive, 2500, 0.99, 2.5},
-        {MMutex_::MutexRecursive, -1, 0, 0.5},  // at once, the mutex never released
-    };
+    const Case cases[] = {{1, 1}, {1999, 1}, {2000, 2}, {2500, 2}, {60000, 60}, {-1, -1}};
     CaptureStderr capture;
     for (const Case& c : cases) {
-        MMutex mutex(c.type);
+        MMutex mutex(MMutex_::MutexRecursive);
         MCondVar cond;
         ASSERT_EQ(0, mutex.Lock(nullptr));
-        int status = 0;
-        const double seconds = SecondsFor([&] { status = cond.Wait(mutex, nullptr, c.timeout); });
-        EXPECT_GE(seconds, c.atLeast) << c.timeout;
-        EXPECT_LE(seconds, c.atMost) << c.timeout;
-        EXPECT_EQ(-5, status);
+        calls = 0;
+        const time_t before = std::time(nullptr);
+        EXPECT_EQ(-5, cond.Wait(mutex, nullptr, c.timeout)) << c.timeout;
+        const time_t after = std::time(nullptr);
         EXPECT_EQ(ETIMEDOUT, cond.LastError());
-        EXPECT_FALSE(FreeElsewhere(mutex));
+        EXPECT_EQ(c.seconds < 0 ? 0 : 1, calls) << c.timeout;
+        if (c.seconds >= 0) {
+            EXPECT_LE(before + c.seconds, deadline.tv_sec) << c.timeout;
+            EXPECT_GE(after + c.seconds, deadline.tv_sec) << c.timeout;
+            EXPECT_EQ(0, deadline.tv_nsec);
+        }
+        EXPECT_EQ(1, mutex.m_count);
         EXPECT_EQ(0, mutex.Unlock(nullptr));
-        EXPECT_TRUE(FreeElsewhere(mutex));
     }
     EXPECT_EQ("", capture.Text());
 }

@@ -6,12 +6,16 @@
 #include <gtest/gtest.h>
 
 #include "support/capture_stderr.h"
+#include "support/scoped_sys_calls.h"
 #include "tessaline/tessaline.h"
+#include "thread/sys.h"
 #include "thread/thread_test_support.h"
 
 using tessaline::test::CaptureStderr;
 using tessaline::test::OnOtherThread;
 using tessaline::test::SecondsFor;
+using tessaline::testing::ScopedSysCalls;
+using tessaline::thread::Sys;
 
 namespace {
 
@@ -149,6 +153,14 @@ TEST(MThread, ObjectWithoutAThread)
     EXPECT_EQ(ESRCH, thread.LastError());
     EXPECT_EQ(1, thread.m_cancelled);
     EXPECT_EQ(-6, thread.Pause(nullptr, 0));
+    {
+        // A failed start leaves the object as it was, and EAGAIN is silent.
+        ScopedSysCalls restore(Sys());
+        Sys().pthread_create = [](pthread_t*, const pthread_attr_t*, void* (*)(void*), void*) { return EAGAIN; };
+        EXPECT_EQ(-1, thread.Create(WaitAtGate, nullptr, 0, 0, 0, nullptr));
+        EXPECT_EQ(EAGAIN, thread.LastError());
+        EXPECT_EQ(0, thread.m_state);
+    }
     // Kill changes the caller's cancellation type: keep that off this thread.
     int err = 0;
     EXPECT_EQ(-1, OnOtherThread([&] { return thread.Kill(&err); }));

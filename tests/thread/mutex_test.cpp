@@ -1,16 +1,19 @@
 #include <cerrno>
 #include <cstring>
 #include <string>
-#include <thread>
 
 #include <gtest/gtest.h>
 
 #include "support/capture_stderr.h"
+#include "support/scoped_sys_calls.h"
 #include "tessaline/tessaline.h"
+#include "thread/sys.h"
 #include "thread/thread_test_support.h"
 
 using tessaline::test::CaptureStderr;
 using tessaline::test::OnOtherThread;
+using tessaline::testing::ScopedSysCalls;
+using tessaline::thread::Sys;
 
 namespace {
 
@@ -104,6 +107,32 @@ TEST(MMutex, TryOnMutexHeldElsewhereReportsEbusyOnce)
         EXPECT_EQ(EBUSY, mutex.LastError());
         EXPECT_EQ(0, mutex.Unlock(nullptr));
     }
+}
+
+// A failed platform call reaches the caller as -1 with its code, and the
+// record of a tracked mutex stays free.
+TEST(MMutex, PlatformFailuresAreReportedAndTakeNothing)
+{
+    ScopedSysCalls restore(Sys());
+    Sys().pthread_mutex_lock = [](pthread_mutex_t*) { return EDEADLK; };
+    Sys().pthread_mutex_trylock = [](pthread_mutex_t*) { return EINVAL; };
+    for (auto type : {MMutex_::MutexPlain, MMutex_::MutexChecked, MMutex_::MutexRecursive}) {
+        MMutex mutex(type);
+        CaptureStderr capture;
+        EXPECT_EQ(-1, mutex.Lock(nullptr));
+        EXPECT_EQ(EDEADLK, mutex.LastError());
+        EXPECT_EQ(-1, mutex.Try(nullptr));
+        EXPECT_EQ(EINVAL, mutex.LastError());
+        EXPECT_EQ(0, mutex.m_held);
+        EXPECT_EQ(0, mutex.Locked());
+        EXPECT_EQ(ExpectedLine(EDEADLK) + ExpectedLine(EINVAL), capture.Text()) << type;
+    }
+    // Create reports each call as it comes, and the last one again as its status.
+    Sys().pthread_mutex_init = [](pthread_mutex_t*, const pthread_mutexattr_t*) { return ENOMEM; };
+    CaptureStderr capture;
+    MMutex broken(MMutex_::MutexPlain);
+    EXPECT_EQ(ENOMEM, broken.LastError());
+    EXPECT_EQ(ExpectedLine(ENOMEM) + ExpectedLine(ENOMEM) + ExpectedLine(ENOMEM), capture.Text());
 }
 
 TEST(MMutex, TypeOutsideTheEnumerationTakesNothing)

@@ -1,14 +1,26 @@
 #include <cerrno>
-#include <csignal>
 #include <string>
-#include <thread>
 
 #include <gtest/gtest.h>
 
 #include "support/capture_stderr.h"
+#include "support/scoped_sys_calls.h"
 #include "tessaline/tessaline.h"
+#include "thread/sys.h"
 
 using tessaline::test::CaptureStderr;
+using tessaline::testing::ScopedSysCalls;
+using tessaline::thread::Sys;
+
+namespace {
+
+int Fail(int code)
+{
+    errno = code;
+    return -1;
+}
+
+}  // namespace
 
 TEST(MSemaphore, CountsTakesAndGivesBackUpTo32767)
 {
@@ -53,23 +65,28 @@ TEST(MSemaphore, NoPlatformObjectUntilInit)
     EXPECT_EQ(1, semaphore.Count());
 }
 
-TEST(MSemaphore, WaitOutlastsAnInterruptingSignal)
+// The semaphore calls report through errno; a wait that a signal handler
+// interrupts goes on waiting.
+TEST(MSemaphore, PlatformFailuresBecomeTheStatusAndTheLastError)
 {
-    struct sigaction action = {};
-    action.sa_handler = [](int) {};  // no SA_RESTART: sem_wait sees EINTR
-    struct sigaction previous = {};
-    ASSERT_EQ(0, sigaction(SIGUSR1, &action, &previous));
-
-    MSemaphore semaphore(0, 0);
-    ASSERT_EQ(0, semaphore.Init(0));
-    int status = -99;
-    std::thread waiter([&] { status = semaphore.Wait(); });
-    std::this_thread::sleep_for(std::chrono::milliseconds(50));
-    pthread_kill(waiter.native_handle(), SIGUSR1);
-    std::this_thread::sleep_for(std::chrono::milliseconds(50));
-    EXPECT_EQ(0, semaphore.Signal());
-    waiter.join();
-    EXPECT_EQ(0, status);
-    EXPECT_EQ(0, semaphore.Count());
-    sigaction(SIGUSR1, &previous, nullptr);
+    static int interruptions;
+    MSemaphore semaphore(1, 0);
+    ScopedSysCalls restore(Sys());
+    Sys().sem_wait = [](sem_t*) { return Fail(--interruptions >= 0 ? EINTR : EINVAL); };
+    Sys().sem_post = [](sem_t*) { return Fail(EOVERFLOW); };
+    Sys().sem_init = [](sem_t*, int, unsigned int) { return Fail(ENOSYS); };
+    CaptureStderr capture;
+    interruptions = 2;
+    EXPECT_EQ(-1, semaphore.Wait());
+    EXPECT_EQ(-1, interruptions);
+    EXPECT_EQ(EINVAL, semaphore.LastError());
+    EXPECT_EQ(-1, semaphore.Signal());
+    EXPECT_EQ(EOVERFLOW, semaphore.LastError());
+    EXPECT_EQ(-1, semaphore.Init(5));
+    EXPECT_EQ(ENOSYS, semaphore.LastError());
+    EXPECT_EQ(-1, semaphore.Count());
+    const std::string text = capture.Text();
+    for (int code : {EINVAL, EOVERFLOW, ENOSYS}) {
+        EXPECT_NE(std::string::npos, text.find("(" + std::to_string(code) + ")\n")) << code;
+    }
 }
