@@ -81,7 +81,9 @@ int LockChecked(MMutex& mutex, HolderLock& holder, int* err, bool blocking) TESS
     return Finish(Keep(mutex, 0), err);
 }
 
-int LockTracked(MMutex& mutex, int* err, bool blocking)
+// Out of line, like the other paths below, so that the public functions
+// reach them by a jump and keep the plain hot path without a frame.
+__attribute__((noinline)) int LockTracked(MMutex& mutex, int* err, bool blocking)
 {
     HolderLock holder(mutex);
     return mutex.m_type == MMutex_::MutexRecursive ? LockRecursive(mutex, holder, err, blocking)
@@ -122,27 +124,26 @@ int RefuseUnlock(MMutex& mutex, int* err)
     return kRefused;
 }
 
-// Lock off the hot path: with `err`, or of a tracked or unknown type. Kept
-// out of line so that the hot path needs no stack frame of its own.
-__attribute__((noinline)) int LockOther(MMutex& mutex, int* err)
+// Lock and Unlock of a plain mutex with `err`, or of a type outside the
+// enumeration, which takes nothing and reports the current m_lastError.
+__attribute__((noinline)) int LockUntracked(MMutex& mutex, int* err)
 {
     if (mutex.m_type == MMutex_::MutexPlain) {
         return Finish(Keep(mutex, Sys().pthread_mutex_lock(&mutex.m_mutex)), err);
     }
-    if (IsTracked(mutex)) {
-        return LockTracked(mutex, err, true);
-    }
     return Finish(LoadRelaxed(mutex.m_lastError), err);
 }
 
-__attribute__((noinline)) int UnlockOther(MMutex& mutex, int* err)
+__attribute__((noinline)) int UnlockUntracked(MMutex& mutex, int* err)
 {
     if (mutex.m_type == MMutex_::MutexPlain) {
         return Finish(Keep(mutex, Sys().pthread_mutex_unlock(&mutex.m_mutex)), err);
     }
-    if (!IsTracked(mutex)) {
-        return Finish(LoadRelaxed(mutex.m_lastError), err);
-    }
+    return Finish(LoadRelaxed(mutex.m_lastError), err);
+}
+
+__attribute__((noinline)) int UnlockTracked(MMutex& mutex, int* err)
+{
     if (IsHeldBy(mutex, pthread_self())) {
         return UnlockAsHolder(mutex, err);
     }
@@ -208,7 +209,10 @@ int MMutex::Lock(int* err)
         const int result = Keep(*this, Sys().pthread_mutex_lock(&m_mutex));
         return result == 0 ? 0 : CHECK_SYSERROR(result);
     }
-    return tessaline::thread::LockOther(*this, err);
+    if (tessaline::thread::IsTracked(*this)) {
+        return tessaline::thread::LockTracked(*this, err, true);
+    }
+    return tessaline::thread::LockUntracked(*this, err);
 }
 
 int MMutex::Try(int* err)
@@ -229,5 +233,8 @@ int MMutex::Unlock(int* err)
         const int result = Keep(*this, Sys().pthread_mutex_unlock(&m_mutex));
         return result == 0 ? 0 : CHECK_SYSERROR(result);
     }
-    return tessaline::thread::UnlockOther(*this, err);
+    if (tessaline::thread::IsTracked(*this)) {
+        return tessaline::thread::UnlockTracked(*this, err);
+    }
+    return tessaline::thread::UnlockUntracked(*this, err);
 }
