@@ -108,10 +108,10 @@ public:
 /**
  * A mutex with plain, checked and recursive modes. The checked and
  * recursive ("tracked") modes keep a record of the holder (m_count, m_owner,
- * m_held). Other threads read it under the inner m_guard, which is held
- * only for short spans and never while blocking on m_mutex; the holder's
- * re-entry and release change it without the guard (its fields are accessed
- * atomically), since no other thread can take the holder's place meanwhile.
+ * m_held). Only the thread that holds m_mutex writes it, so the holder's
+ * acquisition, re-entry and release need no other lock; its fields are
+ * accessed atomically. Other threads look at it under the inner m_guard,
+ * which is held only for short spans and never while blocking on m_mutex.
  *
  * `err`, where given, receives errno just before the call returns, except
  * on a recursive re-entry and on an Unlock by a non-holder.
