@@ -135,6 +135,12 @@ TEST(MThread, TimedWaitRunsOutThenWaitJoinsAndDeliversTheResult)
     EXPECT_EQ(0UL, static_cast<unsigned long>(thread));
     EXPECT_FALSE(thread.Exists());
     EXPECT_EQ(-1, thread.Wait(&result, nullptr, -1));
+
+    // Without a routine the thread ends at once with -1 as its result.
+    MThread empty;
+    ASSERT_EQ(0, empty.Create(nullptr, nullptr, 0, 0, 0, nullptr));
+    EXPECT_EQ(0, empty.Wait(&result, nullptr, 0));
+    EXPECT_EQ(reinterpret_cast<int*>(-1), result);
 }
 
 TEST(MThread, ObjectWithoutAThread)
@@ -177,7 +183,10 @@ TEST(MThread, DetachedThreadIsGivenUpAtOnce)
         ASSERT_EQ(0, thread.Create(how == 2 ? [](void*) -> void* { MThread::Exit(nullptr); } : WaitAtGate, &gate, 0,
                                    how == 0, 0, nullptr));
         if (how == 1) {
+            // The status is Detach's own, not an older error's.
+            thread.StoreLastError(EPERM);
             EXPECT_EQ(0, thread.Detach());
+            EXPECT_EQ(0, thread.LastError());
         }
         if (how == 2) {
             const int status = thread.Wait(nullptr, nullptr, 0);
