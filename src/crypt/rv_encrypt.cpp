@@ -5,7 +5,7 @@
 #include "crypt/text_cipher.h"
 #include "tessaline/crypt/rvEncrypt.h"
 
-using namespace tessaline_crypt;
+using namespace tessaline::crypt;
 
 namespace {
 
@@ -16,20 +16,20 @@ constexpr std::size_t kChainedBytes = kChainedText / 2;
 constexpr std::size_t kChainedPrefix = 4;
 constexpr std::size_t kChainedString = 36;
 
-bool isMarked(const char* text, std::size_t size)
+bool IsMarked(const char* text, std::size_t size)
 {
     return size > 2 * kMarkBytes && (size - 2 * kMarkBytes) % kHexPerBlock == 0 && text[0] == 'D' && text[1] == '9' &&
            text[size - 2] == 'A' && text[size - 1] == 'B';
 }
 
 // Each byte of the chained form is stored xor the byte after it.
-int readChained(const char* text, unsigned char* out, unsigned long* length)
+int ReadChained(const char* text, unsigned char* out, unsigned long* length)
 {
     if (*length < kChainedString + 1)
         return 0;
     unsigned char bytes[kChainedBytes];
     for (std::size_t i = 0; i < kChainedBytes; ++i)
-        bytes[i] = pairValue(text + 2 * i);
+        bytes[i] = PairValue(text + 2 * i);
     for (std::size_t i = kChainedBytes - 1; i-- > 0;)
         bytes[i] ^= bytes[i + 1];
     char* string = reinterpret_cast<char*>(out);
@@ -39,7 +39,7 @@ int readChained(const char* text, unsigned char* out, unsigned long* length)
     return 1;
 }
 
-void copyClearText(const char* text, std::size_t size, unsigned char* out, unsigned long* length)
+void CopyClearText(const char* text, std::size_t size, unsigned char* out, unsigned long* length)
 {
     if (*length >= size + 1) {
         std::memcpy(out, text, size + 1);
@@ -78,16 +78,16 @@ int rvDecrypt(char* text, unsigned char* out, unsigned long* length, unsigned in
         *wasPlain = 0;
     out[0] = '\0';
     const std::size_t size = std::strlen(text);
-    if (isMarked(text, size)) {
+    if (IsMarked(text, size)) {
         char key[kFixedKeyBuffer];
         TwoFishFixedKey(key);
-        return decryptHexText(key, text + kMarkBytes, size - 2 * kMarkBytes, out, length);
+        return DecryptHexText(key, text + kMarkBytes, size - 2 * kMarkBytes, out, length);
     }
     if (size == kChainedText) {
-        if (!readChained(text, out, length))
+        if (!ReadChained(text, out, length))
             return 0;
     } else if (size != 0) {
-        copyClearText(text, size, out, length);
+        CopyClearText(text, size, out, length);
     }
     if (wasPlain != nullptr)
         *wasPlain = 1;

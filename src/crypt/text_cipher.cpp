@@ -11,7 +11,7 @@
 
 #include "tessaline/crypt/rvEncrypt.h"
 
-using namespace tessaline_crypt;
+using namespace tessaline::crypt;
 
 namespace {
 
@@ -41,7 +41,7 @@ public:
     SecretBuffer(const SecretBuffer&) = delete;
     SecretBuffer& operator=(const SecretBuffer&) = delete;
 
-    unsigned char* get() const { return m_bytes; }
+    unsigned char* Get() const { return m_bytes; }
     explicit operator bool() const { return m_bytes != nullptr; }
 
 private:
@@ -56,13 +56,13 @@ struct CipherContext {
     ~CipherContext() { explicit_bzero(this, sizeof *this); }
 };
 
-int keyBitsOf(const char* keyText)
+int KeyBitsOf(const char* keyText)
 {
     const std::size_t digits = std::strlen(keyText);
     return digits == 32 ? 128 : digits == 64 ? 256 : 0;
 }
 
-int hexDigitValue(char c)
+int HexDigitValue(char c)
 {
     if (c >= '0' && c <= '9')
         return c - '0';
@@ -76,11 +76,11 @@ int hexDigitValue(char c)
 // A group of eight hex digits, as strtoul in base 16 reads it. Plain digits,
 // the usual case, are converted here; anything else (a sign, blanks, a "0x",
 // a short or bad group) goes to strtoul itself.
-uint32_t keyGroupValue(const char* group)
+uint32_t KeyGroupValue(const char* group)
 {
     uint32_t value = 0;
     for (std::size_t d = 0; d < kKeyGroupDigits; ++d) {
-        const int digit = hexDigitValue(group[d]);
+        const int digit = HexDigitValue(group[d]);
         if (digit < 0)
             return static_cast<uint32_t>(std::strtoul(group, nullptr, 16));
         value = value << 4 | static_cast<uint32_t>(digit);
@@ -90,7 +90,8 @@ uint32_t keyGroupValue(const char* group)
 
 }  // namespace
 
-int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char direction, char* keyText, int keyBits)
+int tessaline::crypt::TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char direction, char* keyText,
+                                      int keyBits)
 {
     if (key == nullptr || cipher == nullptr || keyText == nullptr)
         return 0;
@@ -111,32 +112,32 @@ int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char dire
         char group[kKeyGroupDigits + 1] = {};
         for (std::size_t d = 0; d < kKeyGroupDigits && *digits != '\0'; ++d)
             group[d] = *digits++;
-        key->key32[i] = keyGroupValue(group);
+        key->key32[i] = KeyGroupValue(group);
     }
     reKey(key);
     return 1;
 }
 
-void TwoFishFixedKey(char* buffer)
+void tessaline::crypt::TwoFishFixedKey(char* buffer)
 {
     if (buffer != nullptr)
         std::memcpy(buffer, kFixedKey, sizeof kFixedKey);
 }
 
-unsigned char tessaline_crypt::pairValue(const char* pair)
+unsigned char tessaline::crypt::PairValue(const char* pair)
 {
-    const int high = hexDigitValue(pair[0]);
-    const int low = high < 0 ? -1 : hexDigitValue(pair[1]);
+    const int high = HexDigitValue(pair[0]);
+    const int low = high < 0 ? -1 : HexDigitValue(pair[1]);
     if (low >= 0)
         return static_cast<unsigned char>(high << 4 | low);
     const char text[3] = {pair[0], pair[1], '\0'};
     return static_cast<unsigned char>(std::strtoul(text, nullptr, 16));
 }
 
-int tessaline_crypt::decryptHexText(char* keyText, const char* text, std::size_t textLength, unsigned char* out,
-                                    unsigned long* length)
+int tessaline::crypt::DecryptHexText(char* keyText, const char* text, std::size_t textLength, unsigned char* out,
+                                     unsigned long* length)
 {
-    const int keyBits = keyBitsOf(keyText);
+    const int keyBits = KeyBitsOf(keyText);
     if (keyBits == 0)
         return 0;
     const std::size_t blocks = textLength / 2 / kBlockBytes;
@@ -148,7 +149,7 @@ int tessaline_crypt::decryptHexText(char* keyText, const char* text, std::size_t
     if (!cipherText)
         return 0;
     for (std::size_t i = 0; i < cipherBytes; ++i)
-        cipherText.get()[i] = static_cast<unsigned char>(~pairValue(text + 2 * i));
+        cipherText.Get()[i] = static_cast<unsigned char>(~PairValue(text + 2 * i));
 
     CipherContext context;
     if (!TwoFishKeySetup(&context.key, &context.cipher, DIR_DECRYPT, keyText, keyBits))
@@ -158,12 +159,12 @@ int tessaline_crypt::decryptHexText(char* keyText, const char* text, std::size_t
     SecretBuffer record(textLength);
     if (!record)
         return 0;
-    blockDecrypt(&context.cipher, &context.key, cipherText.get(), static_cast<int>(blocks * BLOCK_SIZE), record.get());
+    blockDecrypt(&context.cipher, &context.key, cipherText.Get(), static_cast<int>(blocks * BLOCK_SIZE), record.Get());
 
     unsigned long stored = 0;
     unsigned long available = 0;
     if (textLength >= kLengthWordBytes) {
-        const unsigned char* word = record.get();
+        const unsigned char* word = record.Get();
         stored = static_cast<unsigned long>(word[0]) | static_cast<unsigned long>(word[1]) << 8 |
                  static_cast<unsigned long>(word[2]) << 16 | static_cast<unsigned long>(word[3]) << 24;
         available = textLength - kLengthWordBytes;
@@ -173,7 +174,7 @@ int tessaline_crypt::decryptHexText(char* keyText, const char* text, std::size_t
     if (*length > available)
         *length = available;
     if (*length > 0)
-        std::memcpy(out, record.get() + kLengthWordBytes, *length);
+        std::memcpy(out, record.Get() + kLengthWordBytes, *length);
     return 1;
 }
 
@@ -181,14 +182,14 @@ int TwoFishEncrypt(char* key, unsigned char* data, unsigned long length, char* o
 {
     if (key == nullptr || data == nullptr || out == nullptr)
         return 0;
-    const int keyBits = keyBitsOf(key);
+    const int keyBits = KeyBitsOf(key);
     if (keyBits == 0 || length >= kPayloadLimit)
         return 0;
     const std::size_t recordBytes = (((length + 3) >> 4) + 1) * kBlockBytes;
     SecretBuffer record(recordBytes);
     if (!record)
         return 0;
-    unsigned char* bytes = record.get();
+    unsigned char* bytes = record.Get();
     for (std::size_t i = 0; i < kLengthWordBytes; ++i)
         bytes[i] = static_cast<unsigned char>(length >> (8 * i));
     std::memcpy(bytes + kLengthWordBytes, data, length);
@@ -211,5 +212,5 @@ int TwoFishDecrypt(char* key, char* text, unsigned char* out, unsigned long* len
 {
     if (key == nullptr || text == nullptr || out == nullptr || length == nullptr)
         return 0;
-    return decryptHexText(key, text, std::strlen(text), out, length);
+    return DecryptHexText(key, text, std::strlen(text), out, length);
 }

@@ -6,6 +6,8 @@
 
 #include "tessaline/crypt/twofish.h"
 
+namespace tessaline::crypt {
+
 // Clears both instances (the S-box tables only where reKey will not fill
 // them) and keys them for `direction` (0 encrypt, 1 decrypt) from
 // keyBits / 32 groups of 8 hex digits of keyText (at most 8 groups;
@@ -17,18 +19,16 @@ int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char dire
 // null buffer is ignored.
 void TwoFishFixedKey(char* buffer);
 
-namespace tessaline_crypt {
-
 constexpr std::size_t kFixedKeyBuffer = 33;
 
 // The byte a pair of characters stands for: hex digits directly, anything
 // else as strtoul in base 16 reads the pair (low 8 bits).
-unsigned char pairValue(const char* pair);
+unsigned char PairValue(const char* pair);
 
 // TwoFishDecrypt on the first textLength characters of `text`, which need
 // not be terminated there.
-int decryptHexText(char* keyText, const char* text, std::size_t textLength, unsigned char* out, unsigned long* length);
+int DecryptHexText(char* keyText, const char* text, std::size_t textLength, unsigned char* out, unsigned long* length);
 
-}  // namespace tessaline_crypt
+}  // namespace tessaline::crypt
 
 #endif

@@ -8,7 +8,7 @@
 // 4 KiB of tables, whole blocks of a caller's buffer); none can overflow.
 // NOLINTBEGIN(bugprone-implicit-widening-of-multiplication-result)
 
-using namespace tessaline_crypt;
+using namespace tessaline::crypt;
 
 namespace {
 
@@ -17,33 +17,33 @@ constexpr int kSubkeyWords = kWhiteningWords + 2 * kRoundSubkeyPairs;
 
 #define TESSALINE_ALWAYS_INLINE inline __attribute__((always_inline))
 
-TESSALINE_ALWAYS_INLINE uint32_t loadBigEndian(const unsigned char* p)
+TESSALINE_ALWAYS_INLINE uint32_t LoadBigEndian(const unsigned char* p)
 {
     uint32_t word;
     std::memcpy(&word, p, sizeof word);
     return __builtin_bswap32(word);
 }
 
-TESSALINE_ALWAYS_INLINE void storeBigEndian(unsigned char* p, uint32_t word)
+TESSALINE_ALWAYS_INLINE void StoreBigEndian(unsigned char* p, uint32_t word)
 {
     word = __builtin_bswap32(word);
     std::memcpy(p, &word, sizeof word);
 }
 
 // g of a word, byte j of the input (bits 31-8j downwards) indexing table j.
-TESSALINE_ALWAYS_INLINE uint32_t g(const uint32_t* s, uint32_t x)
+TESSALINE_ALWAYS_INLINE uint32_t G(const uint32_t* s, uint32_t x)
 {
     return s[2 * (x >> 24)] ^ s[2 * ((x >> 16) & 0xFF) + 1] ^ s[512 + 2 * ((x >> 8) & 0xFF)] ^ s[513 + 2 * (x & 0xFF)];
 }
 
 // g of the second round input, whose bytes are taken in the order 3, 0, 1, 2.
-TESSALINE_ALWAYS_INLINE uint32_t gRotated(const uint32_t* s, uint32_t x)
+TESSALINE_ALWAYS_INLINE uint32_t GRotated(const uint32_t* s, uint32_t x)
 {
     return s[2 * (x & 0xFF)] ^ s[2 * (x >> 24) + 1] ^ s[512 + 2 * ((x >> 16) & 0xFF)] ^ s[513 + 2 * ((x >> 8) & 0xFF)];
 }
 
 struct Block {
-    uint32_t w[4];
+    uint32_t words[4];
 };
 
 // One round pair on `Lanes` independent blocks at once: the table reads of
@@ -51,120 +51,120 @@ struct Block {
 // round subkeys from the end of the array: a key turned for encryption holds
 // them last first.
 template <int Lanes>
-TESSALINE_ALWAYS_INLINE void encryptLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
+TESSALINE_ALWAYS_INLINE void EncryptLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
 {
     uint32_t x0[Lanes], x1[Lanes], x2[Lanes], x3[Lanes];
 #pragma GCC unroll 4
     for (int l = 0; l < Lanes; ++l) {
-        x0[l] = b[l].w[0] ^ k[0];
-        x1[l] = b[l].w[1] ^ k[1];
-        x2[l] = b[l].w[2] ^ k[2];
-        x3[l] = b[l].w[3] ^ k[3];
+        x0[l] = b[l].words[0] ^ k[0];
+        x1[l] = b[l].words[1] ^ k[1];
+        x2[l] = b[l].words[2] ^ k[2];
+        x3[l] = b[l].words[3] ^ k[3];
     }
     const uint32_t* roundKey = k + kSubkeyWords - 2;
 #pragma GCC unroll 8
     for (int r = 0; r < rounds; r += 2, roundKey -= 4) {
 #pragma GCC unroll 4
         for (int l = 0; l < Lanes; ++l) {
-            const uint32_t t0 = g(s, x0[l]);
-            const uint32_t t1 = gRotated(s, x1[l]);
-            x2[l] = rotateRight(x2[l] ^ (t0 + t1 + roundKey[0]), 1);
-            x3[l] = rotateLeft(x3[l], 1) ^ (t0 + 2 * t1 + roundKey[1]);
+            const uint32_t t0 = G(s, x0[l]);
+            const uint32_t t1 = GRotated(s, x1[l]);
+            x2[l] = RotateRight(x2[l] ^ (t0 + t1 + roundKey[0]), 1);
+            x3[l] = RotateLeft(x3[l], 1) ^ (t0 + 2 * t1 + roundKey[1]);
         }
 #pragma GCC unroll 4
         for (int l = 0; l < Lanes; ++l) {
-            const uint32_t t0 = g(s, x2[l]);
-            const uint32_t t1 = gRotated(s, x3[l]);
-            x0[l] = rotateRight(x0[l] ^ (t0 + t1 + roundKey[-2]), 1);
-            x1[l] = rotateLeft(x1[l], 1) ^ (t0 + 2 * t1 + roundKey[-1]);
+            const uint32_t t0 = G(s, x2[l]);
+            const uint32_t t1 = GRotated(s, x3[l]);
+            x0[l] = RotateRight(x0[l] ^ (t0 + t1 + roundKey[-2]), 1);
+            x1[l] = RotateLeft(x1[l], 1) ^ (t0 + 2 * t1 + roundKey[-1]);
         }
     }
 #pragma GCC unroll 4
     for (int l = 0; l < Lanes; ++l) {
-        b[l].w[0] = x2[l] ^ k[4];
-        b[l].w[1] = x3[l] ^ k[5];
-        b[l].w[2] = x0[l] ^ k[6];
-        b[l].w[3] = x1[l] ^ k[7];
+        b[l].words[0] = x2[l] ^ k[4];
+        b[l].words[1] = x3[l] ^ k[5];
+        b[l].words[2] = x0[l] ^ k[6];
+        b[l].words[3] = x1[l] ^ k[7];
     }
 }
 
 template <int Lanes>
-TESSALINE_ALWAYS_INLINE void decryptLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
+TESSALINE_ALWAYS_INLINE void DecryptLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
 {
     uint32_t x0[Lanes], x1[Lanes], x2[Lanes], x3[Lanes];
 #pragma GCC unroll 4
     for (int l = 0; l < Lanes; ++l) {
-        x0[l] = b[l].w[0] ^ k[4];
-        x1[l] = b[l].w[1] ^ k[5];
-        x2[l] = b[l].w[2] ^ k[6];
-        x3[l] = b[l].w[3] ^ k[7];
+        x0[l] = b[l].words[0] ^ k[4];
+        x1[l] = b[l].words[1] ^ k[5];
+        x2[l] = b[l].words[2] ^ k[6];
+        x3[l] = b[l].words[3] ^ k[7];
     }
     const uint32_t* roundKey = k + kWhiteningWords + 2 * (rounds - 1);
 #pragma GCC unroll 8
     for (int r = 0; r < rounds; r += 2, roundKey -= 4) {
 #pragma GCC unroll 4
         for (int l = 0; l < Lanes; ++l) {
-            const uint32_t t0 = g(s, x0[l]);
-            const uint32_t t1 = gRotated(s, x1[l]);
-            x2[l] = rotateLeft(x2[l], 1) ^ (t0 + t1 + roundKey[0]);
-            x3[l] = rotateRight(x3[l] ^ (t0 + 2 * t1 + roundKey[1]), 1);
+            const uint32_t t0 = G(s, x0[l]);
+            const uint32_t t1 = GRotated(s, x1[l]);
+            x2[l] = RotateLeft(x2[l], 1) ^ (t0 + t1 + roundKey[0]);
+            x3[l] = RotateRight(x3[l] ^ (t0 + 2 * t1 + roundKey[1]), 1);
         }
 #pragma GCC unroll 4
         for (int l = 0; l < Lanes; ++l) {
-            const uint32_t t0 = g(s, x2[l]);
-            const uint32_t t1 = gRotated(s, x3[l]);
-            x0[l] = rotateLeft(x0[l], 1) ^ (t0 + t1 + roundKey[-2]);
-            x1[l] = rotateRight(x1[l] ^ (t0 + 2 * t1 + roundKey[-1]), 1);
+            const uint32_t t0 = G(s, x2[l]);
+            const uint32_t t1 = GRotated(s, x3[l]);
+            x0[l] = RotateLeft(x0[l], 1) ^ (t0 + t1 + roundKey[-2]);
+            x1[l] = RotateRight(x1[l] ^ (t0 + 2 * t1 + roundKey[-1]), 1);
         }
     }
 #pragma GCC unroll 4
     for (int l = 0; l < Lanes; ++l) {
-        b[l].w[0] = x2[l] ^ k[0];
-        b[l].w[1] = x3[l] ^ k[1];
-        b[l].w[2] = x0[l] ^ k[2];
-        b[l].w[3] = x1[l] ^ k[3];
+        b[l].words[0] = x2[l] ^ k[0];
+        b[l].words[1] = x3[l] ^ k[1];
+        b[l].words[2] = x0[l] ^ k[2];
+        b[l].words[3] = x1[l] ^ k[3];
     }
 }
 
-TESSALINE_ALWAYS_INLINE Block loadBlock(const unsigned char* p)
+TESSALINE_ALWAYS_INLINE Block LoadBlock(const unsigned char* p)
 {
-    return Block{{loadBigEndian(p), loadBigEndian(p + 4), loadBigEndian(p + 8), loadBigEndian(p + 12)}};
+    return Block{{LoadBigEndian(p), LoadBigEndian(p + 4), LoadBigEndian(p + 8), LoadBigEndian(p + 12)}};
 }
 
-TESSALINE_ALWAYS_INLINE void storeBlock(unsigned char* p, const Block& b)
+TESSALINE_ALWAYS_INLINE void StoreBlock(unsigned char* p, const Block& b)
 {
     for (int i = 0; i < 4; ++i)
-        storeBigEndian(p + 4 * i, b.w[i]);
+        StoreBigEndian(p + 4 * i, b.words[i]);
 }
 
 enum class Direction { kEncrypt, kDecrypt };
 
 template <Direction D, int Lanes>
-TESSALINE_ALWAYS_INLINE void cipherLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
+TESSALINE_ALWAYS_INLINE void CipherLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
 {
     if (D == Direction::kEncrypt)
-        encryptLanes<Lanes>(s, k, rounds, b);
+        EncryptLanes<Lanes>(s, k, rounds, b);
     else
-        decryptLanes<Lanes>(s, k, rounds, b);
+        DecryptLanes<Lanes>(s, k, rounds, b);
 }
 
 // `Lanes` consecutive blocks in one pass.
 template <Direction D, int Lanes>
-TESSALINE_ALWAYS_INLINE void runLanes(const uint32_t* s, const uint32_t* k, int rounds, const unsigned char* in,
+TESSALINE_ALWAYS_INLINE void RunLanes(const uint32_t* s, const uint32_t* k, int rounds, const unsigned char* in,
                                       unsigned char* out)
 {
     Block b[Lanes];
     for (int l = 0; l < Lanes; ++l)
-        b[l] = loadBlock(in + l * kBlockBytes);
-    cipherLanes<D, Lanes>(s, k, rounds, b);
+        b[l] = LoadBlock(in + l * kBlockBytes);
+    CipherLanes<D, Lanes>(s, k, rounds, b);
     for (int l = 0; l < Lanes; ++l)
-        storeBlock(out + l * kBlockBytes, b[l]);
+        StoreBlock(out + l * kBlockBytes, b[l]);
 }
 
 // Electronic code book: blocks are independent, so they go four at a time,
 // and the last one to three together.
 template <Direction D>
-TESSALINE_ALWAYS_INLINE void runCodeBook(const uint32_t* s, const uint32_t* k, int rounds, long blocks,
+TESSALINE_ALWAYS_INLINE void RunCodeBook(const uint32_t* s, const uint32_t* k, int rounds, long blocks,
                                          const unsigned char* in, unsigned char* out)
 {
     constexpr int kLanes = 4;
@@ -172,22 +172,22 @@ TESSALINE_ALWAYS_INLINE void runCodeBook(const uint32_t* s, const uint32_t* k, i
     // last five go as three and two instead.
     const long tail = blocks % kLanes == 1 && blocks > kLanes ? kLanes + 1 : blocks % kLanes;
     for (; blocks > tail; blocks -= kLanes, in += kLanes * kBlockBytes, out += kLanes * kBlockBytes)
-        runLanes<D, kLanes>(s, k, rounds, in, out);
+        RunLanes<D, kLanes>(s, k, rounds, in, out);
     if (blocks == kLanes + 1) {
-        runLanes<D, 3>(s, k, rounds, in, out);
+        RunLanes<D, 3>(s, k, rounds, in, out);
         blocks -= 3;
         in += 3 * kBlockBytes;
         out += 3 * kBlockBytes;
     }
     switch (blocks) {
     case 3:
-        runLanes<D, 3>(s, k, rounds, in, out);
+        RunLanes<D, 3>(s, k, rounds, in, out);
         break;
     case 2:
-        runLanes<D, 2>(s, k, rounds, in, out);
+        RunLanes<D, 2>(s, k, rounds, in, out);
         break;
     case 1:
-        runLanes<D, 1>(s, k, rounds, in, out);
+        RunLanes<D, 1>(s, k, rounds, in, out);
         break;
     default:
         break;
@@ -196,31 +196,31 @@ TESSALINE_ALWAYS_INLINE void runCodeBook(const uint32_t* s, const uint32_t* k, i
 
 // Cipher block chaining on block words, with the chaining value in `chain`.
 template <Direction D>
-void runChained(const uint32_t* s, const uint32_t* k, int rounds, long blocks, uint32_t* chain, const unsigned char* in,
+void RunChained(const uint32_t* s, const uint32_t* k, int rounds, long blocks, uint32_t* chain, const unsigned char* in,
                 unsigned char* out)
 {
     for (; blocks > 0; --blocks, in += kBlockBytes, out += kBlockBytes) {
-        Block b = loadBlock(in);
+        Block b = LoadBlock(in);
         if (D == Direction::kEncrypt) {
             for (int i = 0; i < 4; ++i)
-                b.w[i] ^= chain[i];
-            encryptLanes<1>(s, k, rounds, &b);
-            std::memcpy(chain, b.w, sizeof b.w);
+                b.words[i] ^= chain[i];
+            EncryptLanes<1>(s, k, rounds, &b);
+            std::memcpy(chain, b.words, sizeof b.words);
         } else {
             const Block cipherWords = b;
-            decryptLanes<1>(s, k, rounds, &b);
+            DecryptLanes<1>(s, k, rounds, &b);
             for (int i = 0; i < 4; ++i)
-                b.w[i] ^= chain[i];
-            std::memcpy(chain, cipherWords.w, sizeof cipherWords.w);
+                b.words[i] ^= chain[i];
+            std::memcpy(chain, cipherWords.words, sizeof cipherWords.words);
         }
-        storeBlock(out, b);
+        StoreBlock(out, b);
     }
 }
 
 // The one-bit feedback loop: each bit is combined with the top bit of the
 // enciphered feedback register, which then shifts left taking in the
 // cipher-text bit.
-int runCfb1(cipherInstance* cipher, keyInstance* key, const unsigned char* input, int inputLen, unsigned char* out,
+int RunCfb1(cipherInstance* cipher, keyInstance* key, const unsigned char* input, int inputLen, unsigned char* out,
             Direction direction)
 {
     cipher->mode = MODE_ECB;
@@ -243,12 +243,12 @@ int runCfb1(cipherInstance* cipher, keyInstance* key, const unsigned char* input
 }
 
 template <Direction D>
-int process(cipherInstance* cipher, keyInstance* key, const unsigned char* input, int inputLen, unsigned char* out)
+int Process(cipherInstance* cipher, keyInstance* key, const unsigned char* input, int inputLen, unsigned char* out)
 {
     if (cipher == nullptr || key == nullptr || (inputLen > 0 && (input == nullptr || out == nullptr)))
         return 0;
     if (cipher->mode == MODE_CFB1)
-        return runCfb1(cipher, key, input, inputLen, out, D);
+        return RunCfb1(cipher, key, input, inputLen, out, D);
 
     const unsigned char direction = D == Direction::kEncrypt ? DIR_ENCRYPT : DIR_DECRYPT;
     if (key->direction != direction)
@@ -261,17 +261,17 @@ int process(cipherInstance* cipher, keyInstance* key, const unsigned char* input
     uint32_t subkeys[kSubkeyWords];
     std::memcpy(subkeys, key->subKeys, sizeof subkeys);
     const uint32_t* s = &key->sBox8x32[0][0];
-    const int rounds = roundsOf(key);
+    const int rounds = RoundsOf(key);
 
     if (cipher->mode == MODE_CBC) {
         uint32_t chain[4];
         std::memcpy(chain, cipher->iv32, sizeof chain);
-        runChained<D>(s, subkeys, rounds, blocks, chain, input, out);
+        RunChained<D>(s, subkeys, rounds, blocks, chain, input, out);
         std::memcpy(cipher->iv32, chain, sizeof chain);
     } else if (rounds == kMaxRounds) {
-        runCodeBook<D>(s, subkeys, kMaxRounds, blocks, input, out);
+        RunCodeBook<D>(s, subkeys, kMaxRounds, blocks, input, out);
     } else {
-        runCodeBook<D>(s, subkeys, rounds, blocks, input, out);
+        RunCodeBook<D>(s, subkeys, rounds, blocks, input, out);
     }
     return inputLen;
 }
@@ -282,12 +282,12 @@ extern "C" {
 
 int blockEncrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input, int inputLen, unsigned char* outBuffer)
 {
-    return process<Direction::kEncrypt>(cipher, key, input, inputLen, outBuffer);
+    return Process<Direction::kEncrypt>(cipher, key, input, inputLen, outBuffer);
 }
 
 int blockDecrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input, int inputLen, unsigned char* outBuffer)
 {
-    return process<Direction::kDecrypt>(cipher, key, input, inputLen, outBuffer);
+    return Process<Direction::kDecrypt>(cipher, key, input, inputLen, outBuffer);
 }
 
 }  // extern "C"

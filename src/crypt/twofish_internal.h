@@ -7,33 +7,33 @@
 
 #include "tessaline/crypt/twofish.h"
 
-namespace tessaline_crypt {
+namespace tessaline::crypt {
 
 constexpr int kRoundSubkeyPairs = 16;
 constexpr int kWhiteningWords = 8;
 constexpr int kMaxRounds = 16;
 
-constexpr int byteShift(int byteIndex)
+constexpr int ByteShift(int byteIndex)
 {
     return 24 - 8 * byteIndex;
 }
 
-constexpr uint32_t byteOf(uint32_t word, int byteIndex)
+constexpr uint32_t ByteOf(uint32_t word, int byteIndex)
 {
-    return (word >> byteShift(byteIndex)) & 0xFF;
+    return (word >> ByteShift(byteIndex)) & 0xFF;
 }
 
-constexpr uint32_t rotateLeft(uint32_t x, int n)
+constexpr uint32_t RotateLeft(uint32_t x, int n)
 {
     return (x << n) | (x >> (32 - n));
 }
-constexpr uint32_t rotateRight(uint32_t x, int n)
+constexpr uint32_t RotateRight(uint32_t x, int n)
 {
     return (x >> n) | (x << (32 - n));
 }
 
 // Rounds a key instance runs, held to what subKeys has room for.
-inline int roundsOf(const keyInstance* key)
+inline int RoundsOf(const keyInstance* key)
 {
     const int rounds = key->numRounds;
     if (rounds < 0)
@@ -41,6 +41,6 @@ inline int roundsOf(const keyInstance* key)
     return rounds > kMaxRounds ? kMaxRounds : rounds & ~1;
 }
 
-}  // namespace tessaline_crypt
+}  // namespace tessaline::crypt
 
 #endif

@@ -11,7 +11,7 @@
 // 4 KiB of tables, whole blocks of a caller's buffer); none can overflow.
 // NOLINTBEGIN(bugprone-implicit-widening-of-multiplication-result)
 
-using namespace tessaline_crypt;
+using namespace tessaline::crypt;
 
 namespace {
 
@@ -29,50 +29,50 @@ constexpr int kStageQ[4][4] = {
 };
 
 template <int Words>
-uint32_t keyedIndex(int byteIndex, uint32_t x, const uint32_t* keyWords)
+uint32_t KeyedIndex(int byteIndex, uint32_t x, const uint32_t* keyWords)
 {
     for (int stage = Words - 1; stage >= 0; --stage)
-        x = P8x8[kStageQ[stage][byteIndex]][x] ^ byteOf(keyWords[stage], byteIndex);
+        x = P8x8[kStageQ[stage][byteIndex]][x] ^ ByteOf(keyWords[stage], byteIndex);
     return x;
 }
 
 // The function h of the cipher, on the key words L0..L(Words-1).
 template <int Words>
-uint32_t h(uint32_t input, const uint32_t* keyWords)
+uint32_t H(uint32_t input, const uint32_t* keyWords)
 {
     uint32_t result = 0;
     for (int j = 0; j < 4; ++j)
-        result ^= MDStab[j][keyedIndex<Words>(j, byteOf(input, j), keyWords)];
+        result ^= MDStab[j][KeyedIndex<Words>(j, ByteOf(input, j), keyWords)];
     return result;
 }
 
 // The subkeys, with h specialised for the number of key words so that its
 // stages unroll.
 template <int Words>
-void fillSubkeys(keyInstance* key, int pairs, const uint32_t* evenWords, const uint32_t* oddWords)
+void FillSubkeys(keyInstance* key, int pairs, const uint32_t* evenWords, const uint32_t* oddWords)
 {
     for (int i = 0; i < pairs; ++i) {
-        const uint32_t a = h<Words>(i * kSubkeyStep, evenWords);
-        const uint32_t b = rotateLeft(h<Words>(i * kSubkeyStep + kSubkeyOdd, oddWords), 8);
+        const uint32_t a = H<Words>(i * kSubkeyStep, evenWords);
+        const uint32_t b = RotateLeft(H<Words>(i * kSubkeyStep + kSubkeyOdd, oddWords), 8);
         key->subKeys[2 * i] = a + b;
-        key->subKeys[2 * i + 1] = rotateLeft(a + 2 * b, 9);
+        key->subKeys[2 * i + 1] = RotateLeft(a + 2 * b, 9);
     }
 }
 
 template <int Words>
-void fillSBoxes(keyInstance* key)
+void FillSBoxes(keyInstance* key)
 {
     uint32_t* table = &key->sBox8x32[0][0];
     const uint32_t* keyWords = key->sboxKeys;
     for (uint32_t x = 0; x < 256; ++x) {
-        table[2 * x] = MDStab[0][keyedIndex<Words>(0, x, keyWords)];
-        table[2 * x + 1] = MDStab[1][keyedIndex<Words>(1, x, keyWords)];
-        table[512 + 2 * x] = MDStab[2][keyedIndex<Words>(2, x, keyWords)];
-        table[512 + 2 * x + 1] = MDStab[3][keyedIndex<Words>(3, x, keyWords)];
+        table[2 * x] = MDStab[0][KeyedIndex<Words>(0, x, keyWords)];
+        table[2 * x + 1] = MDStab[1][KeyedIndex<Words>(1, x, keyWords)];
+        table[512 + 2 * x] = MDStab[2][KeyedIndex<Words>(2, x, keyWords)];
+        table[512 + 2 * x + 1] = MDStab[3][KeyedIndex<Words>(3, x, keyWords)];
     }
 }
 
-int keyWordPairs(int keyLen)
+int KeyWordPairs(int keyLen)
 {
     if (keyLen <= 0)
         return 0;
@@ -80,7 +80,7 @@ int keyWordPairs(int keyLen)
     return pairs;
 }
 
-std::atomic<int> tableQueries{0};
+std::atomic<int> g_tableQueries{0};
 constexpr int kTableQueryLimit = 50;
 
 }  // namespace
@@ -112,7 +112,7 @@ int reKey(keyInstance* key)
     if (__atomic_load_n(&needToBuildMDS, __ATOMIC_ACQUIRE))
         BuildMDS();
 
-    const int pairs = keyWordPairs(key->keyLen);
+    const int pairs = KeyWordPairs(key->keyLen);
     uint32_t evenWords[4] = {0, 0, 0, 0};
     uint32_t oddWords[4] = {0, 0, 0, 0};
     for (int i = 0; i < 4; ++i) {
@@ -123,28 +123,28 @@ int reKey(keyInstance* key)
         key->sboxKeys[pairs - 1 - i] = static_cast<uint32_t>(RS_MDS_Encode(evenWords[i], oddWords[i]));
 
     const int hWords = pairs < 2 ? 2 : pairs;
-    const int subkeyPairs = kWhiteningWords / 2 + roundsOf(key);
+    const int subkeyPairs = kWhiteningWords / 2 + RoundsOf(key);
     switch (hWords) {
     case 4:
-        fillSubkeys<4>(key, subkeyPairs, evenWords, oddWords);
+        FillSubkeys<4>(key, subkeyPairs, evenWords, oddWords);
         break;
     case 3:
-        fillSubkeys<3>(key, subkeyPairs, evenWords, oddWords);
+        FillSubkeys<3>(key, subkeyPairs, evenWords, oddWords);
         break;
     default:
-        fillSubkeys<2>(key, subkeyPairs, evenWords, oddWords);
+        FillSubkeys<2>(key, subkeyPairs, evenWords, oddWords);
         break;
     }
 
     switch (key->keyLen) {
     case 128:
-        fillSBoxes<2>(key);
+        FillSBoxes<2>(key);
         break;
     case 192:
-        fillSBoxes<3>(key);
+        FillSBoxes<3>(key);
         break;
     case 256:
-        fillSBoxes<4>(key);
+        FillSBoxes<4>(key);
         break;
     default:
         break;
@@ -210,14 +210,15 @@ void Xor256(unsigned char* dst, unsigned char* src, unsigned char b)
 int TableOp(int op)
 {
     if (op == 2) {
-        tableQueries.store(0, std::memory_order_relaxed);
+        g_tableQueries.store(0, std::memory_order_relaxed);
         return 1;
     }
     if (op != 3)
         return 1;
     // Counts up to the limit and stays there, so it cannot wrap.
-    int seen = tableQueries.load(std::memory_order_relaxed);
-    while (seen < kTableQueryLimit && !tableQueries.compare_exchange_weak(seen, seen + 1, std::memory_order_relaxed)) {
+    int seen = g_tableQueries.load(std::memory_order_relaxed);
+    while (seen < kTableQueryLimit &&
+           !g_tableQueries.compare_exchange_weak(seen, seen + 1, std::memory_order_relaxed)) {
     }
     return seen + 1 < kTableQueryLimit ? 0 : 1;
 }

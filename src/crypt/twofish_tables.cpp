@@ -71,7 +71,7 @@ constexpr uint8_t kMds[4][4] = {
 // The permutation that ends the chain of byte j, applied before the matrix.
 constexpr int kOuterQ[4] = {1, 0, 1, 0};
 
-uint32_t gfMultiply(uint32_t a, uint32_t b)
+uint32_t FieldMultiply(uint32_t a, uint32_t b)
 {
     uint32_t product = 0;
     for (; b != 0; b >>= 1) {
@@ -84,25 +84,25 @@ uint32_t gfMultiply(uint32_t a, uint32_t b)
     return product;
 }
 
-void fillMdsTable()
+void FillMdsTable()
 {
     for (int column = 0; column < 4; ++column) {
         for (int x = 0; x < 256; ++x) {
             const uint32_t y = P8x8[kOuterQ[column]][x];
             uint32_t word = 0;
             for (int row = 0; row < 4; ++row)
-                word |= gfMultiply(kMds[row][column], y) << tessaline_crypt::byteShift(row);
+                word |= FieldMultiply(kMds[row][column], y) << tessaline::crypt::ByteShift(row);
             MDStab[column][x] = word;
         }
     }
     __atomic_store_n(&needToBuildMDS, 0, __ATOMIC_RELEASE);
 }
 
-std::once_flag mdsOnce;
+std::once_flag g_mdsOnce;
 
 }  // namespace
 
 extern "C" void BuildMDS(void)
 {
-    std::call_once(mdsOnce, fillMdsTable);
+    std::call_once(g_mdsOnce, FillMdsTable);
 }
