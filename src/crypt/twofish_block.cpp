@@ -30,16 +30,28 @@ TESSALINE_ALWAYS_INLINE void StoreBigEndian(unsigned char* p, uint32_t word)
     std::memcpy(p, &word, sizeof word);
 }
 
-// g of a word, byte j of the input (bits 31-8j downwards) indexing table j.
-TESSALINE_ALWAYS_INLINE uint32_t G(const uint32_t* s, uint32_t x)
+// The S-box words as pairs: pair x of the first 256 serves bytes 0 and 1 of
+// the g input with value x, pair 256 + x bytes 2 and 3. Indexing pairs by a
+// byte lets the compiler scale the byte in the address; written as one flat
+// index (2x + 1) it folds the doubling into shifts and masks instead, which
+// costs over a tenth of the block speed.
+using SBoxPairs = const uint32_t (*)[2];
+
+TESSALINE_ALWAYS_INLINE uint32_t Byte(uint32_t x, int shift)
 {
-    return s[2 * (x >> 24)] ^ s[2 * ((x >> 16) & 0xFF) + 1] ^ s[512 + 2 * ((x >> 8) & 0xFF)] ^ s[513 + 2 * (x & 0xFF)];
+    return static_cast<uint8_t>(x >> shift);
+}
+
+// g of a word, byte j of the input (bits 31-8j downwards) indexing table j.
+TESSALINE_ALWAYS_INLINE uint32_t G(SBoxPairs s, uint32_t x)
+{
+    return s[x >> 24][0] ^ s[Byte(x, 16)][1] ^ s[256 + Byte(x, 8)][0] ^ s[256 + Byte(x, 0)][1];
 }
 
 // g of the second round input, whose bytes are taken in the order 3, 0, 1, 2.
-TESSALINE_ALWAYS_INLINE uint32_t GRotated(const uint32_t* s, uint32_t x)
+TESSALINE_ALWAYS_INLINE uint32_t GRotated(SBoxPairs s, uint32_t x)
 {
-    return s[2 * (x & 0xFF)] ^ s[2 * (x >> 24) + 1] ^ s[512 + 2 * ((x >> 16) & 0xFF)] ^ s[513 + 2 * ((x >> 8) & 0xFF)];
+    return s[Byte(x, 0)][0] ^ s[x >> 24][1] ^ s[256 + Byte(x, 16)][0] ^ s[256 + Byte(x, 8)][1];
 }
 
 struct Block {
@@ -51,7 +63,7 @@ struct Block {
 // round subkeys from the end of the array: a key turned for encryption holds
 // them last first.
 template <int Lanes>
-TESSALINE_ALWAYS_INLINE void EncryptLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
+TESSALINE_ALWAYS_INLINE void EncryptLanes(SBoxPairs s, const uint32_t* k, int rounds, Block* b)
 {
     uint32_t x0[Lanes], x1[Lanes], x2[Lanes], x3[Lanes];
 #pragma GCC unroll 4
@@ -89,7 +101,7 @@ TESSALINE_ALWAYS_INLINE void EncryptLanes(const uint32_t* s, const uint32_t* k, 
 }
 
 template <int Lanes>
-TESSALINE_ALWAYS_INLINE void DecryptLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
+TESSALINE_ALWAYS_INLINE void DecryptLanes(SBoxPairs s, const uint32_t* k, int rounds, Block* b)
 {
     uint32_t x0[Lanes], x1[Lanes], x2[Lanes], x3[Lanes];
 #pragma GCC unroll 4
@@ -140,7 +152,7 @@ TESSALINE_ALWAYS_INLINE void StoreBlock(unsigned char* p, const Block& b)
 enum class Direction { kEncrypt, kDecrypt };
 
 template <Direction D, int Lanes>
-TESSALINE_ALWAYS_INLINE void CipherLanes(const uint32_t* s, const uint32_t* k, int rounds, Block* b)
+TESSALINE_ALWAYS_INLINE void CipherLanes(SBoxPairs s, const uint32_t* k, int rounds, Block* b)
 {
     if (D == Direction::kEncrypt)
         EncryptLanes<Lanes>(s, k, rounds, b);
@@ -150,7 +162,7 @@ TESSALINE_ALWAYS_INLINE void CipherLanes(const uint32_t* s, const uint32_t* k, i
 
 // `Lanes` consecutive blocks in one pass.
 template <Direction D, int Lanes>
-TESSALINE_ALWAYS_INLINE void RunLanes(const uint32_t* s, const uint32_t* k, int rounds, const unsigned char* in,
+TESSALINE_ALWAYS_INLINE void RunLanes(SBoxPairs s, const uint32_t* k, int rounds, const unsigned char* in,
                                       unsigned char* out)
 {
     Block b[Lanes];
@@ -164,7 +176,7 @@ TESSALINE_ALWAYS_INLINE void RunLanes(const uint32_t* s, const uint32_t* k, int 
 // Electronic code book: blocks are independent, so they go four at a time,
 // and the last one to three together.
 template <Direction D>
-TESSALINE_ALWAYS_INLINE void RunCodeBook(const uint32_t* s, const uint32_t* k, int rounds, long blocks,
+TESSALINE_ALWAYS_INLINE void RunCodeBook(SBoxPairs s, const uint32_t* k, int rounds, long blocks,
                                          const unsigned char* in, unsigned char* out)
 {
     constexpr int kLanes = 4;
@@ -196,7 +208,7 @@ TESSALINE_ALWAYS_INLINE void RunCodeBook(const uint32_t* s, const uint32_t* k, i
 
 // Cipher block chaining on block words, with the chaining value in `chain`.
 template <Direction D>
-void RunChained(const uint32_t* s, const uint32_t* k, int rounds, long blocks, uint32_t* chain, const unsigned char* in,
+void RunChained(SBoxPairs s, const uint32_t* k, int rounds, long blocks, uint32_t* chain, const unsigned char* in,
                 unsigned char* out)
 {
     for (; blocks > 0; --blocks, in += kBlockBytes, out += kBlockBytes) {
@@ -260,7 +272,7 @@ int Process(cipherInstance* cipher, keyInstance* key, const unsigned char* input
     const long blocks = (inputLen - 1L) / BLOCK_SIZE + 1;
     uint32_t subkeys[kSubkeyWords];
     std::memcpy(subkeys, key->subKeys, sizeof subkeys);
-    const uint32_t* s = &key->sBox8x32[0][0];
+    const SBoxPairs s = reinterpret_cast<SBoxPairs>(&key->sBox8x32[0][0]);
     const int rounds = RoundsOf(key);
 
     if (cipher->mode == MODE_CBC) {
