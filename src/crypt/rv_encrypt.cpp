@@ -60,9 +60,7 @@ int rvEncrypt(unsigned char* data, unsigned long length, char* out)
         out[0] = '\0';
         return 1;
     }
-    char key[kFixedKeyBuffer];
-    TwoFishFixedKey(key);
-    if (!TwoFishEncrypt(key, data, length, out + kMarkBytes))
+    if (!EncryptToText(FixedKeySchedule(), data, length, out + kMarkBytes))
         return 0;
     out[0] = 'D';
     out[1] = '9';
@@ -79,9 +77,7 @@ int rvDecrypt(char* text, unsigned char* out, unsigned long* length, unsigned in
     out[0] = '\0';
     const std::size_t size = std::strlen(text);
     if (IsMarked(text, size)) {
-        char key[kFixedKeyBuffer];
-        TwoFishFixedKey(key);
-        return DecryptHexText(key, text + kMarkBytes, size - 2 * kMarkBytes, out, length);
+        return DecryptText(FixedKeySchedule(), text + kMarkBytes, size - 2 * kMarkBytes, out, length);
     }
     if (size == kChainedText) {
         if (!ReadChained(text, out, length))

@@ -1,4 +1,5 @@
-// Internals of the text encryption shared by its two layers and the tests.
+// What the two text layers share: key set-up from hex text, the fixed text
+// key's schedule, and the record to hex text and back under a ready key.
 #ifndef TESSALINE_SRC_CRYPT_TEXT_CIPHER_H
 #define TESSALINE_SRC_CRYPT_TEXT_CIPHER_H
 
@@ -19,15 +20,22 @@ int TwoFishKeySetup(keyInstance* key, cipherInstance* cipher, unsigned char dire
 // null buffer is ignored.
 void TwoFishFixedKey(char* buffer);
 
-constexpr std::size_t kFixedKeyBuffer = 33;
+// The schedule of the fixed key, built at the first call (safe when threads
+// meet it at once) and never changed afterwards. Serves both directions
+// through CipherBlocks.
+const keyInstance& FixedKeySchedule();
+
+// TwoFishEncrypt under a key already set up.
+int EncryptToText(const keyInstance& key, const unsigned char* data, unsigned long length, char* out);
+
+// TwoFishDecrypt under a key already set up, on the first textLength
+// characters of `text`, which need not be terminated there.
+int DecryptText(const keyInstance& key, const char* text, std::size_t textLength, unsigned char* out,
+                unsigned long* length);
 
 // The byte a pair of characters stands for: hex digits directly, anything
 // else as strtoul in base 16 reads the pair (low 8 bits).
 unsigned char PairValue(const char* pair);
-
-// TwoFishDecrypt on the first textLength characters of `text`, which need
-// not be terminated there.
-int DecryptHexText(char* keyText, const char* text, std::size_t textLength, unsigned char* out, unsigned long* length);
 
 }  // namespace tessaline::crypt
 

@@ -37,6 +37,11 @@ TESSALINE_ALWAYS_INLINE void StoreBigEndian(unsigned char* p, uint32_t word)
 // costs over a tenth of the block speed.
 using SBoxPairs = const uint32_t (*)[2];
 
+SBoxPairs Pairs(const keyInstance& key)
+{
+    return reinterpret_cast<SBoxPairs>(&key.sBox8x32[0][0]);
+}
+
 TESSALINE_ALWAYS_INLINE uint32_t Byte(uint32_t x, int shift)
 {
     return static_cast<uint8_t>(x >> shift);
@@ -149,8 +154,6 @@ TESSALINE_ALWAYS_INLINE void StoreBlock(unsigned char* p, const Block& b)
         StoreBigEndian(p + 4 * i, b.words[i]);
 }
 
-enum class Direction { kEncrypt, kDecrypt };
-
 template <Direction D, int Lanes>
 TESSALINE_ALWAYS_INLINE void CipherLanes(SBoxPairs s, const uint32_t* k, int rounds, Block* b)
 {
@@ -204,6 +207,17 @@ TESSALINE_ALWAYS_INLINE void RunCodeBook(SBoxPairs s, const uint32_t* k, int rou
     default:
         break;
     }
+}
+
+// Keys of 128 to 256 bits all run 16 rounds: as a constant, the round loop
+// unrolls completely.
+template <Direction D>
+void CodeBook(SBoxPairs s, const uint32_t* k, int rounds, long blocks, const unsigned char* in, unsigned char* out)
+{
+    if (rounds == kMaxRounds)
+        RunCodeBook<D>(s, k, kMaxRounds, blocks, in, out);
+    else
+        RunCodeBook<D>(s, k, rounds, blocks, in, out);
 }
 
 // Cipher block chaining on block words, with the chaining value in `chain`.
@@ -270,21 +284,16 @@ int Process(cipherInstance* cipher, keyInstance* key, const unsigned char* input
         return inputLen;
     // A last partial block counts as a whole one.
     const long blocks = (inputLen - 1L) / BLOCK_SIZE + 1;
+    if (cipher->mode != MODE_CBC) {
+        CipherBlocks(D, *key, input, blocks, out);
+        return inputLen;
+    }
     uint32_t subkeys[kSubkeyWords];
     std::memcpy(subkeys, key->subKeys, sizeof subkeys);
-    const SBoxPairs s = reinterpret_cast<SBoxPairs>(&key->sBox8x32[0][0]);
-    const int rounds = RoundsOf(key);
-
-    if (cipher->mode == MODE_CBC) {
-        uint32_t chain[4];
-        std::memcpy(chain, cipher->iv32, sizeof chain);
-        RunChained<D>(s, subkeys, rounds, blocks, chain, input, out);
-        std::memcpy(cipher->iv32, chain, sizeof chain);
-    } else if (rounds == kMaxRounds) {
-        RunCodeBook<D>(s, subkeys, kMaxRounds, blocks, input, out);
-    } else {
-        RunCodeBook<D>(s, subkeys, rounds, blocks, input, out);
-    }
+    uint32_t chain[4];
+    std::memcpy(chain, cipher->iv32, sizeof chain);
+    RunChained<D>(Pairs(*key), subkeys, RoundsOf(key), blocks, chain, input, out);
+    std::memcpy(cipher->iv32, chain, sizeof chain);
     return inputLen;
 }
 
@@ -303,4 +312,19 @@ int blockDecrypt(cipherInstance* cipher, keyInstance* key, unsigned char* input,
 }
 
 }  // extern "C"
+
+void tessaline::crypt::CipherBlocks(Direction direction, const keyInstance& key, const unsigned char* in, long blocks,
+                                    unsigned char* out)
+{
+    // The local copy also keeps the block loop free of indirection through
+    // the key.
+    uint32_t subkeys[kSubkeyWords];
+    std::memcpy(subkeys, key.subKeys, sizeof subkeys);
+    if (key.direction != (direction == Direction::kEncrypt ? DIR_ENCRYPT : DIR_DECRYPT))
+        ReverseRoundPairs(subkeys);
+    if (direction == Direction::kEncrypt)
+        CodeBook<Direction::kEncrypt>(Pairs(key), subkeys, RoundsOf(&key), blocks, in, out);
+    else
+        CodeBook<Direction::kDecrypt>(Pairs(key), subkeys, RoundsOf(&key), blocks, in, out);
+}
 // NOLINTEND(bugprone-implicit-widening-of-multiplication-result)

@@ -1,5 +1,6 @@
-// Word helpers shared by the engine's key schedule and block code. Bytes of
-// a word are numbered from the most significant end: byte 0 is bits 31-24.
+// What the engine's key schedule, its block code and the text forms share.
+// Bytes of a word are numbered from the most significant end: byte 0 is
+// bits 31-24.
 #ifndef TESSALINE_SRC_CRYPT_TWOFISH_INTERNAL_H
 #define TESSALINE_SRC_CRYPT_TWOFISH_INTERNAL_H
 
@@ -40,6 +41,19 @@ inline int RoundsOf(const keyInstance* key)
         return 0;
     return rounds > kMaxRounds ? kMaxRounds : rounds & ~1;
 }
+
+enum class Direction { kEncrypt, kDecrypt };
+
+// Swaps the 16 round subkey pairs of `subKeys` end for end.
+void ReverseRoundPairs(uint32_t* subKeys);
+
+// Code-book mode over `blocks` whole blocks from `in` to `out` (which may be
+// `in` itself). Unlike blockEncrypt and blockDecrypt this never writes the
+// key: a key turned for the other direction is turned on a copy of its
+// subkeys, so one schedule can serve any number of threads in both
+// directions.
+void CipherBlocks(Direction direction, const keyInstance& key, const unsigned char* in, long blocks,
+                  unsigned char* out);
 
 }  // namespace tessaline::crypt
 

@@ -188,16 +188,7 @@ unsigned long RS_MDS_Encode(unsigned long k0, unsigned long k1)
 
 void ReverseRoundSubkeys(keyInstance* key, unsigned char newDir)
 {
-    uint32_t* first = key->subKeys + kWhiteningWords;
-    uint32_t* last = first + 2 * (kRoundSubkeyPairs - 1);
-    for (; first < last; first += 2, last -= 2) {
-        const uint32_t even = first[0];
-        const uint32_t odd = first[1];
-        first[0] = last[0];
-        first[1] = last[1];
-        last[0] = even;
-        last[1] = odd;
-    }
+    ReverseRoundPairs(key->subKeys);
     key->direction = newDir;
 }
 
@@ -224,4 +215,18 @@ int TableOp(int op)
 }
 
 }  // extern "C"
+
+void tessaline::crypt::ReverseRoundPairs(uint32_t* subKeys)
+{
+    uint32_t* first = subKeys + kWhiteningWords;
+    uint32_t* last = first + 2 * (kRoundSubkeyPairs - 1);
+    for (; first < last; first += 2, last -= 2) {
+        const uint32_t even = first[0];
+        const uint32_t odd = first[1];
+        first[0] = last[0];
+        first[1] = last[1];
+        last[0] = even;
+        last[1] = odd;
+    }
+}
 // NOLINTEND(bugprone-implicit-widening-of-multiplication-result)

@@ -24,8 +24,11 @@
  * says how much room it needs. Payloads of 2^28 - 4 bytes or more are
  * refused with 0 (the engine counts bits in an int).
  *
- * Thread safety: every function may run in any number of threads at once;
- * each call keys its own cipher on its own stack.
+ * Thread safety: every function may run in any number of threads at once.
+ * TwoFishEncrypt and TwoFishDecrypt key a cipher of their own on the stack
+ * for each call; rvEncrypt and rvDecrypt share the fixed key's schedule,
+ * which the first of them to run builds (threads that meet there wait for
+ * it) and which is only read from then on.
  *
  * Port note: the length arguments are unsigned long, 64 bits on x86-64; the
  * length word of the record stays 32 bits, and TwoFishHere returns a full
