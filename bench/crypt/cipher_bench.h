@@ -6,9 +6,10 @@
 // Groups (see common/bench_names.h):
 //   crypt_ecb_encrypt/<impl>/16MiB, crypt_ecb_decrypt/<impl>/16MiB
 //   crypt_key_setup/<impl>/128, crypt_key_setup/<impl>/256
-//   crypt_text_encrypt/<impl>/64B: Tessaline's rvEncrypt of 64 bytes (key
-//     schedule, five blocks, hex text); for a peer its key setup, four blocks
-//     and the same hex step.
+//   crypt_text_encrypt/<impl>/64B: Tessaline's rvEncrypt of 64 bytes (five
+//     blocks and the hex text; the fixed key's schedule is made once per
+//     process); for a peer its key setup, four blocks and the same hex step,
+//     as a host that keys per message.
 //   crypt_text_decrypt/<impl>/64B: the way back.
 #ifndef TESSALINE_BENCH_CRYPT_CIPHER_BENCH_H
 #define TESSALINE_BENCH_CRYPT_CIPHER_BENCH_H
