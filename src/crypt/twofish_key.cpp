@@ -1,5 +1,6 @@
 // Key set-up of the engine: makeKey, the Reed-Solomon step, the full-keying
 // expansion in reKey, and the small companions of the classic interface.
+#include <algorithm>
 #include <atomic>
 #include <climits>
 #include <cstring>
@@ -72,12 +73,10 @@ void FillSBoxes(keyInstance* key)
     }
 }
 
+// 64-bit pairs of key words, held to what key32 has room for.
 int KeyWordPairs(int keyLen)
 {
-    if (keyLen <= 0)
-        return 0;
-    const int pairs = (keyLen > 256 ? 256 : keyLen + 63) / 64;
-    return pairs;
+    return (std::clamp(keyLen, 0, 256) + 63) / 64;
 }
 
 std::atomic<int> g_tableQueries{0};
