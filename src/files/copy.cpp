@@ -81,8 +81,9 @@ bool IsRefusedScheme(const char* text)
         return false;
     }
     rvFilename name(text, 0);
-    const int scheme = HashToken(name.Scheme(), tessaline::g_schemeTokens, tessaline::kSchemeTokenLast, 0, 1);
-    return scheme == tessaline::kSchemeFtp || scheme == tessaline::kSchemeHttp;
+    const int scheme =
+        HashToken(name.Scheme(), tessaline::files::g_schemeTokens, tessaline::files::kSchemeTokenLast, 0, 1);
+    return scheme == tessaline::files::kSchemeFtp || scheme == tessaline::files::kSchemeHttp;
 }
 
 // CreateDir for a target; below the host's path the parent is already open.

@@ -11,7 +11,7 @@
 
 namespace {
 
-namespace sys = tessaline::files::sys;
+using tessaline::files::Sys;
 
 constexpr mode_t kNewDirectoryMode = 06775;
 
@@ -28,33 +28,40 @@ void CopyCut(char* out, const char* text, size_t length)
 
 int CreateDir(const char* path, long extra)
 {
-    if (!path)
+    if (!path) {
         path = "";
-    if (sys::Access(path, F_OK) == 0)
+    }
+    if (Sys().access(path, F_OK) == 0) {
         return 1;
-    if (errno != ENOENT)
+    }
+    if (errno != ENOENT) {
         return 0;
+    }
 
     rvFilename name(path, 0);
     rvFilename parent(name.Directory(), 0);
     // The walk ends where the directory of a name is the name itself.
-    if (!(parent == name) && !CreateDir(name.Directory(), extra))
+    if (!(parent == name) && !CreateDir(name.Directory(), extra)) {
         return 0;
+    }
     // A name with a trailing "/" is its own parent and exists by now.
-    if (sys::Access(path, F_OK) == 0)
+    if (Sys().access(path, F_OK) == 0) {
         return 1;
-    return sys::MakeDirectory(path, kNewDirectoryMode) == 0 ? 1 : 0;
+    }
+    return Sys().mkdir(path, kNewDirectoryMode) == 0 ? 1 : 0;
 }
 
 char* GetFullDirectoryName(const char* path, char* out, unsigned int length)
 {
-    if (!out || length == 0)
+    if (!out || length == 0) {
         return out;
-    if (!path)
+    }
+    if (!path) {
         path = "";
+    }
     // Resolved before `out` is written, since the two may be one buffer.
     char resolved[tessaline::files::kPathWorkArea];
-    const char* full = sys::ResolvePath(path, resolved) ? resolved : path;
+    const char* full = Sys().realpath(path, resolved) ? resolved : path;
     CopyCut(out, full, length);
     return out;
 }
@@ -62,16 +69,18 @@ char* GetFullDirectoryName(const char* path, char* out, unsigned int length)
 int FileExists(const char* path)
 {
     struct stat info;
-    return sys::Stat(path ? path : "", &info) == 0 ? 1 : 0;
+    return Sys().stat(path ? path : "", &info) == 0 ? 1 : 0;
 }
 
 long long DiskFreeSpace(const char* path)
 {
     struct statfs info;
-    if (sys::FileSystemStatus(path ? path : "", &info) != 0)
+    if (Sys().statfs(path ? path : "", &info) != 0) {
         return 0;
+    }
     long long bytes = 0;
-    if (__builtin_mul_overflow(info.f_bavail, info.f_bsize, &bytes))
+    if (__builtin_mul_overflow(info.f_bavail, info.f_bsize, &bytes)) {
         return LLONG_MAX;
+    }
     return bytes;
 }

@@ -92,7 +92,8 @@ int RemoveFile(const Place& place)
     }
     if (Sys().unlinkat(place.directory, place.name, 0) != 0) {
         const int error = errno;
-        std::fprintf(stderr, "rvUnlink: Could not remove %s: %s (%d).\n", place.text, tessaline::util::ErrorText(error), error);
+        std::fprintf(stderr, "rvUnlink: Could not remove %s: %s (%d).\n", place.text, tessaline::util::ErrorText(error),
+                     error);
         return 0;
     }
     return 1;
