@@ -1,4 +1,4 @@
-// The text of a directory member, as the tree walks name it.
+// The texts of directory members, as the tree walks name them.
 #include "files/member_text.h"
 
 #include <algorithm>
@@ -8,24 +8,25 @@
 
 namespace tessaline::files {
 
-std::string MemberText(const char* directory, const char* entry)
+std::string JoinedText(const char* directory, const char* name, size_t nameLength)
 {
     std::string text = directory;
     if (!text.empty() && text.back() != '/' && text.back() != '\\') {
         text += '/';
     }
+    text.append(name, nameLength);
+    const size_t translated = std::min(text.size(), kMaxTranslateLength);
+    std::replace(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(translated), '\\', '/');
+    return text;
+}
+
+std::string MemberText(const char* directory, const char* entry)
+{
     // An entry holds no "/", so it splits into file and extension alone; an
     // empty extension drops its dot ("a." joins as "a", "..." as "..").
     const char* dot = std::strrchr(entry, '.');
     const bool emptyExtension = dot != nullptr && dot[1] == '\0';
-    text.append(entry, emptyExtension ? static_cast<size_t>(dot - entry) : std::strlen(entry));
-    const size_t translated = std::min(text.size(), kMaxTranslateLength);
-    for (size_t i = 0; i < translated; ++i) {
-        if (text[i] == '\\') {
-            text[i] = '/';
-        }
-    }
-    return text;
+    return JoinedText(directory, entry, emptyExtension ? static_cast<size_t>(dot - entry) : std::strlen(entry));
 }
 
 }  // namespace tessaline::files

@@ -4,6 +4,9 @@
 #include <string.h>
 #include <unistd.h>
 
+#include <string>
+#include <vector>
+
 #include "files/path_limits.h"
 #include "files/sys.h"
 #include "tessaline/files/rvFilename.h"
@@ -26,29 +29,36 @@ void CopyCut(char* out, const char* text, size_t length)
 
 }  // namespace
 
-int CreateDir(const char* path, long extra)
+int CreateDir(const char* path, long /*extra*/)
 {
-    if (!path) {
-        path = "";
+    // Up from `path` to the first name that exists or the top, then down
+    // again making each: a loop, so that a deep path does not reach the
+    // host's stack.
+    std::vector<std::string> missing;
+    std::string text = path != nullptr ? path : "";
+    for (;;) {
+        if (Sys().access(text.c_str(), F_OK) == 0) {
+            break;
+        }
+        if (errno != ENOENT) {
+            return 0;
+        }
+        missing.push_back(text);
+        rvFilename name(text.c_str(), 0);
+        const rvFilename parent(name.Directory(), 0);
+        // The walk ends where the directory of a name is the name itself.
+        if (parent == name) {
+            break;
+        }
+        text = name.Directory();
     }
-    if (Sys().access(path, F_OK) == 0) {
-        return 1;
+    for (auto name = missing.rbegin(); name != missing.rend(); ++name) {
+        // A name with a trailing "/" is its own parent and exists by now.
+        if (Sys().access(name->c_str(), F_OK) != 0 && Sys().mkdir(name->c_str(), kNewDirectoryMode) != 0) {
+            return 0;
+        }
     }
-    if (errno != ENOENT) {
-        return 0;
-    }
-
-    rvFilename name(path, 0);
-    rvFilename parent(name.Directory(), 0);
-    // The walk ends where the directory of a name is the name itself.
-    if (!(parent == name) && !CreateDir(name.Directory(), extra)) {
-        return 0;
-    }
-    // A name with a trailing "/" is its own parent and exists by now.
-    if (Sys().access(path, F_OK) == 0) {
-        return 1;
-    }
-    return Sys().mkdir(path, kNewDirectoryMode) == 0 ? 1 : 0;
+    return 1;
 }
 
 char* GetFullDirectoryName(const char* path, char* out, unsigned int length)

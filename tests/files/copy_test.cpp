@@ -16,8 +16,8 @@
 #include "tessaline/files/rvCopy.h"
 
 using namespace tessaline::test;
-using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
+using tessaline::testing::ScopedSysCalls;
 
 namespace {
 

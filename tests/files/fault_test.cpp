@@ -25,9 +25,9 @@
 #include "tessaline/files/rvFileApi.h"
 
 using namespace tessaline::test;
-using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
 using tessaline::files::SysCalls;
+using tessaline::testing::ScopedSysCalls;
 
 namespace {
 

@@ -17,8 +17,8 @@
 #include "tessaline/files/rvFileApi.h"
 
 using namespace tessaline::test;
-using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
+using tessaline::testing::ScopedSysCalls;
 
 namespace {
 

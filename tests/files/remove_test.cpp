@@ -19,8 +19,8 @@
 #include "tessaline/files/rvFilename.h"
 
 using namespace tessaline::test;
-using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
+using tessaline::testing::ScopedSysCalls;
 
 namespace {
 
