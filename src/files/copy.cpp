@@ -272,13 +272,22 @@ private:
     // a level of its own.
     int CopyOne(const End& source, const End& target)
     {
-        // One stat of the source serves every question asked of it below.
-        // It stands for `access` as well: for mere existence both fail alike.
+        // The source is opened first and examined through its handle, so
+        // that what is copied is what was examined. Non-blocking, so that a
+        // FIFO opens at once (and copies as its size, 0) instead of waiting
+        // for a writer. Where it cannot be opened, a stat stands in for
+        // `access` (for mere existence both fail alike), and the open is
+        // tried again with the attempts of CreateFile only when needed.
+        constexpr int kSourceAccess = O_RDONLY | O_NONBLOCK | O_CLOEXEC;
+        OwnedHandle from(Handle(Sys().openat(source.place.directory, source.place.name, kSourceAccess, 0)));
         struct stat sourceInfo;
-        if (StatAt(source.place, &sourceInfo) != 0) {
+        const bool examined = from.IsOpen() ? Sys().fstat(Descriptor(from.Get()), &sourceInfo) == 0
+                                            : StatAt(source.place, &sourceInfo) == 0;
+        if (!examined) {
             return 0;
         }
         if (IsDirectoryAt(source.place, sourceInfo) == 1) {
+            from.Close();
             // Below the host's path the text is not split again: the split
             // asks the file system, which may answer differently by now.
             const std::string wildcard =
@@ -307,11 +316,11 @@ private:
         if (targetExists && IsSameFile(sourceInfo, targetInfo)) {
             return 0;
         }
-
-        OwnedHandle from(
-            CreateFileAt(source.place.directory, source.place.name, O_RDONLY | O_CLOEXEC, 0, kSourceOpenMode));
         if (!from.IsOpen()) {
-            return 0;
+            from.Reset(CreateFileAt(source.place.directory, source.place.name, kSourceAccess, 0, kSourceOpenMode));
+            if (!from.IsOpen() || Sys().fstat(Descriptor(from.Get()), &sourceInfo) != 0) {
+                return 0;
+            }
         }
         // Below the host's path a link at the target's name is not written
         // through: it may lead anywhere.
@@ -321,7 +330,7 @@ private:
         if (!to.IsOpen()) {
             return 0;
         }
-        bool copied = CopyBytes(from.Get(), to.Get());
+        bool copied = CopyBytes(from.Get(), to.Get(), static_cast<int64_t>(sourceInfo.st_size));
         from.Close();
         copied = to.Close() == 1 && copied;
 

@@ -179,6 +179,9 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
              return rvCopyFile(p.source.c_str(), (p.target + ".d/target").c_str(), 0, 1, 0, 0, nullptr, nullptr, 0644);
          },
          0, kOld},
+        {"source cannot be examined (fstat fails)", false,
+         [] { Sys().fstat = [](int, struct stat*) { return Fail(EIO); }; },
+         [](const Paths& p) { return CopyOver(p, 1); }, 0, kOld},
         {"up to date: never opened", false,
          [] { Sys().write = [](int, const void*, size_t) -> ssize_t { return Fail(ENOSPC); }; },
          [](const Paths& p) {
@@ -212,8 +215,6 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
          },
          0, kMissing},
         {"file size limit, replacing a target", true, [] { LimitFileSize(20000); },
-         [](const Paths& p) { return CopyOver(p, 1); }, 0, kMissing},
-        {"source size unknown (fstat fails)", false, [] { Sys().fstat = [](int, struct stat*) { return Fail(EIO); }; },
          [](const Paths& p) { return CopyOver(p, 1); }, 0, kMissing},
         {"read fails (EIO)", false,
          [] {
