@@ -132,7 +132,10 @@ private:
 
 int CompareDirectoriesByFileSize(const char* first, const char* second)
 {
-    return tessaline::files::TreeCompare().Run(first != nullptr ? first : "", second != nullptr ? second : "");
+    // The texts as rvFilename normalizes them: backslashes turned to "/".
+    const rvFilename firstName(first, 0);
+    const rvFilename secondName(second, 0);
+    return tessaline::files::TreeCompare().Run(firstName, secondName);
 }
 
 int64_t rvGetFileSize(const char* path)

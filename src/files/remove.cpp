@@ -63,10 +63,9 @@ private:
         Listing listing;
         std::string memberDirectory;
         unsigned int recurse;
-        bool tree;
-        // The tree's own name, in the directory of the level above or, at
-        // -1, at the host's path.
-        std::string name;
+        // A tree's own name, in the directory of the level above or, at -1,
+        // at the host's path; empty for the matches of a wildcard.
+        std::string treeName;
         ptrdiff_t parentLevel;
     };
 
@@ -116,8 +115,8 @@ private:
             break;
         }
         if (entered) {
-            m_levels.push_back(Level{Listing(Deepest(), plan.pattern.c_str()), plan.memberDirectory, recurse, false,
-                                     std::string(), -1});
+            m_levels.push_back(
+                Level{Listing(Deepest(), plan.pattern.c_str()), plan.memberDirectory, recurse, std::string(), -1});
         }
     }
 
@@ -129,7 +128,7 @@ private:
             RemoveDirectory(place.directory, place.name);
             return;
         }
-        m_levels.push_back(Level{Listing(Deepest(), "*"), place.text, 1, true, place.name, parentLevel});
+        m_levels.push_back(Level{Listing(Deepest(), "*"), place.text, 1, place.name, parentLevel});
     }
 
     // The next member of the deepest level, or the end of that level.
@@ -159,10 +158,10 @@ private:
     {
         m_directories.Pop();
         const Level& level = m_levels.back();
-        if (level.tree) {
+        if (!level.treeName.empty()) {
             const int parent = level.parentLevel < 0 ? AT_FDCWD : m_directories.At(level.parentLevel);
-            if (parent >= 0 || parent == AT_FDCWD) {
-                RemoveDirectory(parent, level.name.c_str());
+            if (parent != -1) {
+                RemoveDirectory(parent, level.treeName.c_str());
             }
         }
         m_levels.pop_back();

@@ -92,9 +92,10 @@ bool NameInside(const char* directoryText, const char* memberText, std::string* 
     }
     const char* member = memberText;
     const char* directory = directoryText;
+    // Both texts are translated already: a directory text short enough to
+    // pass here holds no backslash.
     for (; *directory != '\0'; ++directory, ++member) {
-        const bool same = *member == *directory || (*directory == '\\' && *member == '/');
-        if (!same) {
+        if (*member != *directory) {
             return false;
         }
     }
@@ -166,7 +167,7 @@ WalkPlan PlanWalk(const Place& entry, const char* wildcardText)
         plan.from = WalkFrom::kHostPath;
     } else if (SameDirectoryText(plan.directory, entry.text)) {
         plan.from = WalkFrom::kEntry;
-    } else if (NameInside(plan.directory.c_str(), entry.text, &name) && name == entry.name) {
+    } else if (NameInside(plan.directory.c_str(), entry.text, &name)) {
         plan.from = WalkFrom::kEntryDirectory;
     }
     return plan;
@@ -183,9 +184,10 @@ Listing::Listing(int directory, const char* pattern)
         Sys().close(fd);
         return;
     }
+    // A listing leaves errno as it was: an unreadable rest of a directory
+    // lists nothing more, like an unreadable directory.
     const int callerError = errno;
     for (;;) {
-        errno = 0;
         const dirent* entry = Sys().readdir(dir.get());
         if (entry == nullptr) {
             break;
@@ -196,9 +198,7 @@ Listing::Listing(int directory, const char* pattern)
             m_names.append(name, std::strlen(name) + 1);
         }
     }
-    if (errno == 0) {
-        errno = callerError;
-    }
+    errno = callerError;
 }
 
 const char* Listing::Next(unsigned char* type)

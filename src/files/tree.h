@@ -89,7 +89,7 @@ enum class WalkFrom {
     kNothing,         // the text names no place to list
     kHostPath,        // the directory text, opened as the host wrote it
     kEntry,           // the entry itself, opened relative to its directory
-    kEntryDirectory,  // the directory the entry is in, again
+    kEntryDirectory,  // the directory the entry is in: the walk's own
 };
 
 struct WalkPlan {
