@@ -116,7 +116,7 @@ std::set<std::string> Shape(const std::string& top)
 
 // Runs `walks` in a child process on a thread with a 256 KiB stack and at
 // most 128 descriptors, as a small host thread would; the results it stores,
-// or -1 each when the child dies.
+// or -1 each when the child dies or runs for two minutes.
 template <size_t kCount>
 std::array<int, kCount> InSmallThread(void (*walks)(std::array<int, kCount>*))
 {
@@ -128,6 +128,7 @@ std::array<int, kCount> InSmallThread(void (*walks)(std::array<int, kCount>*))
     }
     const pid_t child = fork();
     if (child == 0) {
+        alarm(120);  // a walk that never ends fails too
         const struct rlimit descriptors = {128, 128};
         setrlimit(RLIMIT_NOFILE, &descriptors);
         pthread_attr_t attributes;
