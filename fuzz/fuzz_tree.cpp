@@ -1,10 +1,10 @@
 // Random small trees with symbolic links, cycles included (links to ".",
-// "..", an ancestor, the tree's top, a directory outside), and names that
-// read as patterns or as other names, copied, compared and removed. Beyond
-// "no crash": every call ends, nothing outside the trees changes, the copy
-// leaves its source as it was, and no directory of the copy stands for a
-// source directory that is already on its own path, which the copy would
-// make only by entering a directory twice.
+// "..", the tree's top and the directory above it, a directory outside), and
+// names that read as patterns or as other names, copied, compared and
+// removed. Beyond "no crash": every call ends, nothing outside the trees
+// changes, the copy leaves its source as it was, and no directory of the
+// copy stands for a source directory that is already on its own path, which
+// the copy would make only by entering a directory twice.
 #include <fuzzer/FuzzedDataProvider.h>
 
 #include <stdlib.h>
@@ -130,7 +130,9 @@ void Build(FuzzedDataProvider& input, const std::string& source, const std::stri
             std::ofstream(path, std::ios::binary) << input.ConsumeRandomLengthString(64);
             break;
         case 2: {
-            const std::string targets[] = {".", "..", "../..", source, outside, directories.back(), "nowhere"};
+            // Every link stays inside the scratch directory: a walk may read
+            // all it leads to.
+            const std::string targets[] = {".", "..", source, Root(), outside, directories.back(), "nowhere"};
             symlink(input.PickValueInArray(targets).c_str(), path.c_str());
             break;
         }
