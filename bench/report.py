@@ -55,7 +55,7 @@ TARGETS = [
     ("Files", "copy a tree of 10,000 files of 1 KiB", "files_tree_copy/tessaline/100x100",
      [("files_tree_copy/std_fs/100x100", 1.0)]),
     ("Files", "rvUnlink of that tree", "files_tree_remove/tessaline/100x100",
-     [("files_tree_remove/std_fs/100x100", 1.1)]),
+     [("files_tree_remove/std_fs/100x100", 1.05)]),
     ("Files", "walk 100,000 entries by pattern", "files_walk/tessaline/100000",
      [("files_walk/readdir_fnmatch/100000", 1.2)]),
 ]

@@ -9,11 +9,13 @@
 //   files_tree_copy/<impl>/<dirs>x<files>    files of 1 KiB, three sizes
 //   files_tree_remove/<impl>/<dirs>x<files>
 //   files_walk/<impl>/<entries>              pattern "*7.txt", three sizes
+#include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include <dirent.h>
@@ -152,6 +154,14 @@ void Run(std::vector<std::string> arguments)
     }
 }
 
+// Writes back what a round left dirty and lets the file system settle, so
+// that the next round does not pay for it.
+void Settle()
+{
+    sync();
+    std::this_thread::sleep_for(std::chrono::milliseconds(50));
+}
+
 // One 256 MiB file, copied onto an existing target.
 
 template <typename Copy>
@@ -163,21 +173,32 @@ void CopyLarge(benchmark::State& state, const char* name, Copy copy)
         copy(source, target);
     state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * kLargeFileBytes));
     fs::remove(target);
+    Settle();
 }
 
 // Trees of small files: copy (the removal of the copy not timed), and
-// removal (the copy to remove not timed).
+// removal (the copy to remove not timed). A tree's dirty pages and journal
+// are written back by whatever runs next, so each round starts from a synced
+// and settled file system, and is one repetition of its own: the report
+// takes the median of the rounds, which bench/run interleaves with the
+// peers'. One untimed round first warms each implementation.
+
+constexpr int kTreeRounds = 15;
 
 template <typename CopyTree>
 void TreeCopy(benchmark::State& state, const char* name, TreeSize size, CopyTree copy)
 {
     const std::string source = Inputs::Get().Tree(size);
     const std::string target = Inputs::Get().Scratch(name);
+    if (!fs::exists(target + ".warm")) {
+        copy(source, target + ".warm");
+    }
     for (auto _ : state) {
-        copy(source, target);
         state.PauseTiming();
         fs::remove_all(target);
+        Settle();
         state.ResumeTiming();
+        copy(source, target);
     }
     state.SetItemsProcessed(state.iterations() * size.directories * size.files);
 }
@@ -187,14 +208,26 @@ void TreeRemove(benchmark::State& state, const char* name, TreeSize size, Remove
 {
     const std::string source = Inputs::Get().Tree(size);
     const std::string target = Inputs::Get().Scratch(name);
+    if (!fs::exists(target + ".warm")) {
+        fs::copy(source, target + ".warm", fs::copy_options::recursive);
+        remove(target + ".warm");
+        fs::create_directory(target + ".warm");
+    }
     for (auto _ : state) {
         state.PauseTiming();
         fs::copy(source, target, fs::copy_options::recursive);
+        Settle();
         state.ResumeTiming();
         remove(target);
     }
     state.SetItemsProcessed(state.iterations() * size.directories * size.files);
-    fs::remove_all(target);
+}
+
+// One round per repetition, as many repetitions as the tree benchmarks
+// need for a stable median.
+benchmark::internal::Benchmark* Rounds(benchmark::internal::Benchmark* bench)
+{
+    return bench->Iterations(1)->Repetitions(kTreeRounds);
 }
 
 // A walk by pattern; every implementation counts the matches.
@@ -319,9 +352,9 @@ using WalkFunction = int (*)(const std::string&);
         for (const auto& c : copiers) {
             if (c.copyTree != nullptr) {
                 const std::string target = std::string("treecopy.") + c.impl;
-                WallClock(bench::Register("files_tree_copy", c.impl, size.Label(), [=](benchmark::State& state) {
+                Rounds(WallClock(bench::Register("files_tree_copy", c.impl, size.Label(), [=](benchmark::State& state) {
                     TreeCopy(state, target.c_str(), size, c.copyTree);
-                }));
+                })));
             }
         }
     }
@@ -329,9 +362,9 @@ using WalkFunction = int (*)(const std::string&);
         if (c.removeTree != nullptr) {
             const TreeSize size = kTreeSizes[2];
             const std::string target = std::string("treeremove.") + c.impl;
-            WallClock(bench::Register("files_tree_remove", c.impl, size.Label(), [=](benchmark::State& state) {
+            Rounds(WallClock(bench::Register("files_tree_remove", c.impl, size.Label(), [=](benchmark::State& state) {
                 TreeRemove(state, target.c_str(), size, c.removeTree);
-            }));
+            })));
         }
     }
     const struct {
@@ -349,8 +382,6 @@ using WalkFunction = int (*)(const std::string&);
                                       [=](benchmark::State& state) { WalkBench(state, entries, w.walk); }));
         }
     }
-    // Last: the dirty pages of a 256 MiB copy slow every write that
-    // follows until the kernel has written them back.
     for (const auto& c : copiers) {
         if (c.copyFile != nullptr) {
             const std::string target = std::string("large.") + c.impl;

@@ -8,7 +8,6 @@
 
 #include "files/handle.h"
 #include "files/sys.h"
-#include "tessaline/files/rvCopy.h"
 #include "tessaline/files/rvFileApi.h"
 
 namespace tessaline::files {
@@ -58,12 +57,9 @@ void CopyInKernel(void* from, void* to, int64_t* left)
 
 }  // namespace
 
-bool CopyBytes(void* from, void* to)
+bool CopyBytes(void* from, void* to, int64_t size)
 {
-    int64_t left = rvGetFileSize64(from);
-    if (left < 0) {
-        return false;
-    }
+    int64_t left = size;
     CopyInKernel(from, to, &left);
     char buffer[kCopyBufferSize];
     while (left != 0) {

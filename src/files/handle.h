@@ -35,6 +35,13 @@ public:
     bool IsOpen() const { return m_handle != InvalidHandle(); }
     void* Get() const { return m_handle; }
 
+    // Closes the handle held and takes `handle`.
+    void Reset(void* handle)
+    {
+        Close();
+        m_handle = handle;
+    }
+
     // 1 when the handle closed cleanly (or was not open).
     int Close()
     {

@@ -4,6 +4,9 @@
 #include <string.h>
 #include <unistd.h>
 
+#include <string>
+#include <vector>
+
 #include "files/path_limits.h"
 #include "files/sys.h"
 #include "tessaline/files/rvFilename.h"
@@ -11,7 +14,7 @@
 
 namespace {
 
-namespace sys = tessaline::files::sys;
+using tessaline::files::Sys;
 
 constexpr mode_t kNewDirectoryMode = 06775;
 
@@ -26,35 +29,49 @@ void CopyCut(char* out, const char* text, size_t length)
 
 }  // namespace
 
-int CreateDir(const char* path, long extra)
+int CreateDir(const char* path, long /*extra*/)
 {
-    if (!path)
-        path = "";
-    if (sys::Access(path, F_OK) == 0)
-        return 1;
-    if (errno != ENOENT)
-        return 0;
-
-    rvFilename name(path, 0);
-    rvFilename parent(name.Directory(), 0);
-    // The walk ends where the directory of a name is the name itself.
-    if (!(parent == name) && !CreateDir(name.Directory(), extra))
-        return 0;
-    // A name with a trailing "/" is its own parent and exists by now.
-    if (sys::Access(path, F_OK) == 0)
-        return 1;
-    return sys::MakeDirectory(path, kNewDirectoryMode) == 0 ? 1 : 0;
+    // Up from `path` to the first name that exists or the top, then down
+    // again making each: a loop, so that a deep path does not reach the
+    // host's stack.
+    std::vector<std::string> missing;
+    std::string text = path != nullptr ? path : "";
+    for (;;) {
+        if (Sys().access(text.c_str(), F_OK) == 0) {
+            break;
+        }
+        if (errno != ENOENT) {
+            return 0;
+        }
+        missing.push_back(text);
+        rvFilename name(text.c_str(), 0);
+        const rvFilename parent(name.Directory(), 0);
+        // The walk ends where the directory of a name is the name itself.
+        if (parent == name) {
+            break;
+        }
+        text = name.Directory();
+    }
+    for (auto name = missing.rbegin(); name != missing.rend(); ++name) {
+        // A name with a trailing "/" is its own parent and exists by now.
+        if (Sys().access(name->c_str(), F_OK) != 0 && Sys().mkdir(name->c_str(), kNewDirectoryMode) != 0) {
+            return 0;
+        }
+    }
+    return 1;
 }
 
 char* GetFullDirectoryName(const char* path, char* out, unsigned int length)
 {
-    if (!out || length == 0)
+    if (!out || length == 0) {
         return out;
-    if (!path)
+    }
+    if (!path) {
         path = "";
+    }
     // Resolved before `out` is written, since the two may be one buffer.
     char resolved[tessaline::files::kPathWorkArea];
-    const char* full = sys::ResolvePath(path, resolved) ? resolved : path;
+    const char* full = Sys().realpath(path, resolved) ? resolved : path;
     CopyCut(out, full, length);
     return out;
 }
@@ -62,16 +79,18 @@ char* GetFullDirectoryName(const char* path, char* out, unsigned int length)
 int FileExists(const char* path)
 {
     struct stat info;
-    return sys::Stat(path ? path : "", &info) == 0 ? 1 : 0;
+    return Sys().stat(path ? path : "", &info) == 0 ? 1 : 0;
 }
 
 long long DiskFreeSpace(const char* path)
 {
     struct statfs info;
-    if (sys::FileSystemStatus(path ? path : "", &info) != 0)
+    if (Sys().statfs(path ? path : "", &info) != 0) {
         return 0;
+    }
     long long bytes = 0;
-    if (__builtin_mul_overflow(info.f_bavail, info.f_bsize, &bytes))
+    if (__builtin_mul_overflow(info.f_bavail, info.f_bsize, &bytes)) {
         return LLONG_MAX;
+    }
     return bytes;
 }

@@ -12,6 +12,7 @@ namespace {
 
 using tessaline::files::kMaxTranslateLength;
 using tessaline::files::kPathWorkArea;
+using tessaline::files::Sys;
 
 bool IsSlash(char c)
 {
@@ -21,8 +22,9 @@ bool IsSlash(char c)
 char* Translate(char* text, char from, char to)
 {
     for (size_t i = 0; i < kMaxTranslateLength && text[i]; ++i) {
-        if (text[i] == from)
+        if (text[i] == from) {
             text[i] = to;
+        }
     }
     return text;
 }
@@ -30,8 +32,9 @@ char* Translate(char* text, char from, char to)
 // A rope without `from` is left as it is, so it stays shared.
 rvFilename::rope& Translate(rvFilename::rope& path, char from, char to)
 {
-    if (path.find(from) == rvFilename::rope::npos)
+    if (path.find(from) == rvFilename::rope::npos) {
         return path;
+    }
     std::string text(path.size(), '\0');
     path.copy(text.data());
     std::replace(text.begin(), text.end(), from, to);
@@ -58,13 +61,15 @@ char* rvFilename::NormalizePath(char* path)
 
 char* rvFilename::XlatPathToDOS(char* path)
 {
-    if (!path)
+    if (!path) {
         return path;
+    }
     char* start = path;
     if (char* separator = strstr(path, "://")) {
         start = separator + 3;
-        while (*start == '/')
+        while (*start == '/') {
             ++start;
+        }
     }
     Translate(start, '/', '\\');
     return path;
@@ -87,14 +92,17 @@ rvFilename::rope& rvFilename::XlatPathToDOS(rope& path)
 
 int rvFilename::IsDirectory(const char* path)
 {
-    if (!path || !*path)
+    if (!path || !*path) {
         return 0;
+    }
     struct stat info;
-    if (tessaline::files::sys::Stat(path, &info) == 0)
+    if (Sys().stat(path, &info) == 0) {
         return DirectoryBit(info);
+    }
     size_t length = strlen(path);
-    if (!IsSlash(path[length - 1]))
+    if (!IsSlash(path[length - 1])) {
         return 0;
+    }
 
     // Trailing separators are forgiven one at a time; a loop rather than
     // recursion keeps the stack flat however many there are.
@@ -103,10 +111,12 @@ int rvFilename::IsDirectory(const char* path)
     memcpy(work, path, length);
     work[--length] = '\0';
     while (length > 0) {
-        if (tessaline::files::sys::Stat(work, &info) == 0)
+        if (Sys().stat(work, &info) == 0) {
             return DirectoryBit(info);
-        if (!IsSlash(work[length - 1]))
+        }
+        if (!IsSlash(work[length - 1])) {
             return 0;
+        }
         work[--length] = '\0';
     }
     return 0;
@@ -114,5 +124,5 @@ int rvFilename::IsDirectory(const char* path)
 
 int rvFilename::Exists(const char* path, int mode)
 {
-    return tessaline::files::sys::Access(path ? path : "", mode) == 0 ? 1 : 0;
+    return Sys().access(path ? path : "", mode) == 0 ? 1 : 0;
 }

@@ -3,10 +3,6 @@
 #include <string.h>
 #include <strings.h>
 
-#include <memory>
-#include <string>
-
-#include "files/member_text.h"
 #include "files/path_limits.h"
 #include "tessaline/util/rvString.h"
 
@@ -38,8 +34,9 @@ void StoreCut(char** field, const char* begin, size_t length)
 void BackslashesToSlashes(char* text)
 {
     for (; *text; ++text) {
-        if (*text == '\\')
+        if (*text == '\\') {
             *text = '/';
+        }
     }
 }
 
@@ -84,22 +81,26 @@ char* JoinParts(const char* scheme, const char* server, const char* directory, c
     TextBuilder text(16 + LengthOf(scheme) + LengthOf(server) + LengthOf(directory) + LengthOf(file) + LengthOf(ext));
     if (HasText(scheme)) {
         text.Append(scheme);
-        if (!text.Holds("://"))
+        if (!text.Holds("://")) {
             text.Append("://");
+        }
     }
     if (HasText(server)) {
-        if (!text.Holds("://"))
+        if (!text.Holds("://")) {
             text.Append("//");
+        }
         text.Append(server);
     }
     if (HasText(directory)) {
         text.Append(directory);
         char last = directory[strlen(directory) - 1];
-        if (last != '/' && last != '\\')
+        if (last != '/' && last != '\\') {
             text.Append("/");
+        }
     }
-    if (HasText(file))
+    if (HasText(file)) {
         text.Append(file);
+    }
     if (HasText(ext)) {
         text.Append(".");
         text.Append(ext);
@@ -112,8 +113,9 @@ char* JoinParts(const char* scheme, const char* server, const char* directory, c
 const char* FindJoined(const char* path, const char* scheme, const char* server, const char* directory,
                        const char* file, const char* ext)
 {
-    if (!path)
+    if (!path) {
         return rvFilename::m_pNullStr;
+    }
     rvFilename rebuilt;
     rebuilt.Join(scheme, server, directory, file, ext);
     const char* found = strstr(path, rebuilt());
@@ -135,8 +137,9 @@ rvFilename::rvFilename(const char* text, unsigned int remote)
       m_remote(remote)
 {
     m_pPath = Dup(text, -1);
-    if (m_pPath)
+    if (m_pPath) {
         Split(nullptr);
+    }
 }
 
 rvFilename::rvFilename(const rvFilename& other) : rvFilename(nullptr, 0)
@@ -146,24 +149,28 @@ rvFilename::rvFilename(const rvFilename& other) : rvFilename(nullptr, 0)
 
 rvFilename& rvFilename::operator=(const rvFilename& other)
 {
-    if (this == &other)
+    if (this == &other) {
         return *this;
+    }
     return *this = other.m_pPath;
 }
 
 rvFilename& rvFilename::operator=(const char* text)
 {
-    if (text == m_pPath)
+    if (text == m_pPath) {
         return *this;
-    if (m_pPath && text && _stricmp(text, m_pPath) == 0)
+    }
+    if (m_pPath && text && _stricmp(text, m_pPath) == 0) {
         return *this;
+    }
     // Copied before the old text goes, since `text` may point into it.
     char* copy = Dup(text, -1);
     delete[] m_pPath;
     m_pPath = copy;
     Clear();
-    if (m_pPath)
+    if (m_pPath) {
         Split(nullptr);
+    }
     return *this;
 }
 
@@ -183,8 +190,9 @@ void rvFilename::Clear()
 
 char* rvFilename::Dup(const char* text, int length)
 {
-    if (!text)
+    if (!text) {
         return nullptr;
+    }
     size_t size = BlockSize(length < 0 ? strlen(text) : static_cast<size_t>(length));
     char* block = new char[size];
     strncpy(block, text, size);
@@ -206,8 +214,9 @@ void rvFilename::Split(const char* text)
         *this = text;
         return;
     }
-    if (!HasText(m_pPath))
+    if (!HasText(m_pPath)) {
         return;
+    }
 
     char work[kPathWorkArea];
     strncpy(work, m_pPath, kMaxSplitLength);
@@ -219,8 +228,9 @@ void rvFilename::Split(const char* text)
         StoreCut(&m_pScheme, work, static_cast<size_t>(separator - work));
         BackslashesToSlashes(m_pScheme);
         cursor = separator + 1;
-        if (strstr(cursor, "///"))
+        if (strstr(cursor, "///")) {
             ++cursor;
+        }
     }
 
     if (cursor[0] == '/' && cursor[1] == '/') {
@@ -233,8 +243,9 @@ void rvFilename::Split(const char* text)
         }
     }
 
-    if (m_pScheme && IsRemoteScheme(m_pScheme))
+    if (m_pScheme && IsRemoteScheme(m_pScheme)) {
         m_remote = 1;
+    }
 
     if (strchr(cursor, '/')) {
         const char* directory = cursor;
@@ -245,8 +256,9 @@ void rvFilename::Split(const char* text)
             length = lastSlash ? static_cast<size_t>(lastSlash - directory) + 1 : 1;
         }
         cursor += length;
-        while (length > 1 && directory[length - 1] == '/')
+        while (length > 1 && directory[length - 1] == '/') {
             --length;
+        }
         StoreCut(&m_pDirectory, directory, length);
         BackslashesToSlashes(m_pDirectory);
     } else if (!*cursor || strcmp(cursor, ".") == 0 || strcmp(cursor, "..") == 0) {
@@ -259,8 +271,9 @@ void rvFilename::Split(const char* text)
         StoreCut(&m_pExt, dot + 1, strlen(dot + 1));
         *dot = '\0';
     }
-    if (*cursor)
+    if (*cursor) {
         StoreCut(&m_pFile, cursor, strlen(cursor));
+    }
 
     NormalizePath(m_pPath);
 }
@@ -269,8 +282,9 @@ const char* rvFilename::Join(const char* scheme, const char* server, const char*
                              const char* ext)
 {
     if (!scheme && !server && !directory && !file && !ext) {
-        if (!m_pScheme && !m_pServer && !m_pDirectory && !m_pFile && !m_pExt)
+        if (!m_pScheme && !m_pServer && !m_pDirectory && !m_pFile && !m_pExt) {
             return m_pNullStr;
+        }
         return Join(m_pScheme, m_pServer, m_pDirectory, m_pFile, m_pExt);
     }
 
@@ -371,8 +385,9 @@ int rvFilename::IsURL()
 
 int rvFilename::Empty(const char* text)
 {
-    if (!text)
+    if (!text) {
         text = m_pPath;
+    }
     return HasText(text) ? 0 : 1;
 }
 
@@ -393,28 +408,19 @@ rvFilename::operator const char*() const
 
 int rvFilename::operator==(const rvFilename& other) const
 {
-    if (!m_pPath || !other.m_pPath)
+    if (!m_pPath || !other.m_pPath) {
         return !m_pPath && !other.m_pPath ? 1 : 0;
+    }
     return _stricmp(m_pPath, other.m_pPath) == 0 ? 1 : 0;
 }
 
 int rvFilename::operator<(const rvFilename& other) const
 {
-    if (!m_pPath)
+    if (!m_pPath) {
         return other.m_pPath ? 0 : 1;
-    if (!other.m_pPath)
+    }
+    if (!other.m_pPath) {
         return 0;
+    }
     return _stricmp(m_pPath, other.m_pPath) > 0 ? 1 : 0;
 }
-
-namespace tessaline::files {
-
-std::string MemberText(const char* directory, const char* entry)
-{
-    rvFilename item(entry, 0);
-    const std::unique_ptr<char[]> joined(JoinParts(item.Scheme(), item.Server(), directory, item.File(), item.Ext()));
-    rvFilename::NormalizePath(joined.get());
-    return joined.get();
-}
-
-}  // namespace tessaline::files

@@ -6,7 +6,7 @@
 
 #include "files/sys.h"
 
-namespace sys = tessaline::files::sys;
+using tessaline::files::Sys;
 
 char rvSharedLib::m_defLibExt[16] = "so";
 int rvSharedLib::m_disposition = RTLD_NOW | RTLD_GLOBAL;
@@ -14,8 +14,9 @@ int rvSharedLib::m_disposition = RTLD_NOW | RTLD_GLOBAL;
 rvSharedLib::rvSharedLib(const char* name, int flags)
     : m_error(0), m_handle(nullptr), m_name(nullptr, 0), m_flags(flags)
 {
-    if (name && rvSharedLib::Open(name, m_disposition, 0))
+    if (name && rvSharedLib::Open(name, m_disposition, 0)) {
         m_name = name;
+    }
 }
 
 rvSharedLib::~rvSharedLib()
@@ -25,26 +26,30 @@ rvSharedLib::~rvSharedLib()
 
 rvSharedLib& rvSharedLib::operator=(const rvSharedLib& other)
 {
-    if (this != &other)
+    if (this != &other) {
         Open(other.m_name(), m_disposition, 0);
+    }
     return *this;
 }
 
 int rvSharedLib::Open(const char* name, int disposition, int /*extra*/)
 {
     rvFilename file(m_name);
-    if (name)
+    if (name) {
         file = name;
+    }
     if (!*file.Ext()) {
         file.Dup(&file.m_pExt, m_defLibExt, -1);
         file.Join(nullptr, nullptr, nullptr, nullptr, nullptr);
     }
 
     m_error = 0;
-    m_handle = sys::OpenLibrary(file(), disposition);
+    m_handle = Sys().dlopen(file(), disposition);
     if (!m_handle) {
         m_error = errno;
-        sys::DiscardLibraryError();
+        // The loader's message is pending until read; read it so that it
+        // does not surface in the host's next dlerror.
+        Sys().dlerror();
         return 0;
     }
     m_name = file;
@@ -55,11 +60,13 @@ int rvSharedLib::Open(const char* name, int disposition, int /*extra*/)
 int rvSharedLib::Close()
 {
     m_error = 0;
-    if (!m_handle)
+    if (!m_handle) {
         return 0;
-    int result = sys::CloseLibrary(m_handle);
-    if (result != 0)
+    }
+    int result = Sys().dlclose(m_handle);
+    if (result != 0) {
         m_error = errno;
+    }
     m_handle = nullptr;
     return result == 0 ? 1 : 0;
 }
@@ -76,9 +83,10 @@ void* rvSharedLib::ResolveSymbol(const char* symbol)
         m_error = EINVAL;
         return nullptr;
     }
-    void* address = sys::LibrarySymbol(m_handle, symbol);
-    if (!address)
+    void* address = Sys().dlsym(m_handle, symbol);
+    if (!address) {
         m_error = errno;
+    }
     return address;
 }
 
@@ -105,8 +113,9 @@ rvSharedLib::operator const char*()
 char* rvSharedLib::DefaultExtension(const char* extension)
 {
     memset(m_defLibExt, 0, sizeof m_defLibExt);
-    if (extension)
+    if (extension) {
         strncpy(m_defLibExt, extension, sizeof m_defLibExt - 1);
+    }
     return m_defLibExt;
 }
 

@@ -1,6 +1,6 @@
 #include "files/scheme_tokens.h"
 
-namespace tessaline {
+namespace tessaline::files {
 
 _tokenHash g_schemeTokens[kSchemeTokenLast + 1] = {
     {"file", kSchemeFile},
@@ -8,4 +8,4 @@ _tokenHash g_schemeTokens[kSchemeTokenLast + 1] = {
     {"http", kSchemeHttp},
 };
 
-}  // namespace tessaline
+}  // namespace tessaline::files

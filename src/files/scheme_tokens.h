@@ -5,7 +5,7 @@
 
 #include "tessaline/util/HashToken.h"
 
-namespace tessaline {
+namespace tessaline::files {
 
 enum SchemeToken { kSchemeFile = 0, kSchemeFtp = 1, kSchemeHttp = 2 };
 
@@ -13,6 +13,6 @@ enum SchemeToken { kSchemeFile = 0, kSchemeFtp = 1, kSchemeHttp = 2 };
 constexpr int kSchemeTokenLast = 2;
 extern _tokenHash g_schemeTokens[kSchemeTokenLast + 1];
 
-}  // namespace tessaline
+}  // namespace tessaline::files
 
 #endif

@@ -2,7 +2,6 @@
 #include "files/sys.h"
 
 #include <dlfcn.h>
-#include <errno.h>
 #include <fcntl.h>
 #include <stdlib.h>
 #include <unistd.h>
@@ -41,10 +40,11 @@ int StatFileSystem(const char* path, struct statfs* info)
 }
 
 SysCalls g_sys = {
-    OpenFile,       ::close,     ::read,    ::write,    ::copy_file_range, ::lseek,     StatHandle, StatPath,
-    ::lockf,        ::access,    ::chmod,   ::mkdir,    ::unlink,          ::rmdir,     ::symlink,  ::realpath,
-    StatFileSystem, ::opendir, ::readdir,  ::closedir,        ::pathconf,  OpenFileAt, StatAt,
-    ::faccessat,    ::unlinkat,  ::mkdirat, ::fchmodat, ::symlinkat,       ::fdopendir,
+    OpenFile,    ::close,    ::read,         ::write,    ::copy_file_range, ::lseek,    StatHandle,
+    StatPath,    ::lockf,    ::access,       ::chmod,    ::mkdir,           ::unlink,   ::rmdir,
+    ::symlink,   ::realpath, StatFileSystem, ::opendir,  ::readdir,         ::closedir, ::pathconf,
+    OpenFileAt,  StatAt,     ::faccessat,    ::unlinkat, ::mkdirat,         ::fchmodat, ::symlinkat,
+    ::fdopendir, ::dlopen,   ::dlclose,      ::dlsym,    ::dlerror,
 };
 
 }  // namespace
@@ -53,56 +53,5 @@ SysCalls& Sys()
 {
     return g_sys;
 }
-
-namespace sys {
-
-int Stat(const char* path, struct stat* info)
-{
-    return Sys().stat(path, info);
-}
-
-int Access(const char* path, int mode)
-{
-    return Sys().access(path, mode);
-}
-
-int MakeDirectory(const char* path, mode_t mode)
-{
-    return Sys().mkdir(path, mode);
-}
-
-char* ResolvePath(const char* path, char* resolved)
-{
-    return Sys().realpath(path, resolved);
-}
-
-int FileSystemStatus(const char* path, struct statfs* info)
-{
-    return Sys().statfs(path, info);
-}
-
-void* OpenLibrary(const char* name, int mode)
-{
-    return ::dlopen(name, mode);
-}
-
-int CloseLibrary(void* handle)
-{
-    return ::dlclose(handle);
-}
-
-void* LibrarySymbol(void* handle, const char* symbol)
-{
-    return ::dlsym(handle, symbol);
-}
-
-void DiscardLibraryError()
-{
-    int saved = errno;
-    ::dlerror();
-    errno = saved;
-}
-
-}  // namespace sys
 
 }  // namespace tessaline::files

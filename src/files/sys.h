@@ -50,28 +50,16 @@ struct SysCalls {
     int (*fchmodat)(int directory, const char* path, mode_t mode, int flags);
     int (*symlinkat)(const char* existing, int directory, const char* created);
     DIR* (*fdopendir)(int fd);
+    // The dynamic loader.
+    void* (*dlopen)(const char* name, int mode);
+    int (*dlclose)(void* handle);
+    void* (*dlsym)(void* handle, const char* symbol);
+    char* (*dlerror)();
 };
 
 // The live table. Tests reach it by linking the library's objects
 // statically; the shared object does not export it.
 SysCalls& Sys();
-
-namespace sys {
-
-int Stat(const char* path, struct stat* info);
-int Access(const char* path, int mode);
-int MakeDirectory(const char* path, mode_t mode);
-// realpath into a caller's area of PATH_MAX bytes.
-char* ResolvePath(const char* path, char* resolved);
-int FileSystemStatus(const char* path, struct statfs* info);
-
-void* OpenLibrary(const char* name, int mode);
-int CloseLibrary(void* handle);
-void* LibrarySymbol(void* handle, const char* symbol);
-// Clears the loader's pending message, keeping errno.
-void DiscardLibraryError();
-
-}  // namespace sys
 
 }  // namespace tessaline::files
 

@@ -1,5 +1,6 @@
 // The pieces the tree copy and removal walk with: open directory descriptors,
-// places named relative to them, and directory listings by pattern.
+// places named relative to them, directory listings by pattern, and the
+// stack of directories a walk is in.
 //
 // A walk resolves the path the host named once. Below it, every member is
 // reached through the descriptor of the directory it was listed in, so a
@@ -7,14 +8,17 @@
 // works cannot redirect it. Member texts are still formed as rvFilename forms
 // them (messages and recursion read them); a text that no longer names a
 // single entry of its directory is not acted on.
+//
+// The walks keep their place in the tree on the heap, never in recursion,
+// so the depth of a tree does not reach the host thread's stack.
 #ifndef TESSALINE_SRC_FILES_TREE_H
 #define TESSALINE_SRC_FILES_TREE_H
 
 #include <fcntl.h>
 #include <sys/stat.h>
 
-#include <functional>
 #include <string>
+#include <vector>
 
 class rvFilename;
 
@@ -80,29 +84,90 @@ bool NameInside(const char* directoryText, const char* memberText, std::string* 
 // there is none.
 void SplitWalk(const char* path, rvFilename* directory, rvFilename* pattern);
 
-// The walk of a wildcard text: the open directory its members live in, the
-// text they are joined to, and the pattern they must match.
-struct Walk {
-    DirectoryFd owned;            // the directory, when the walk opened one
-    int directory = -1;           // -1: nothing to walk
-    std::string memberDirectory;  // what rvFilename joins member names to
-    std::string pattern;
-    bool throughLink = false;  // the directory was reached through a link
+// Where the walk of a wildcard text lists its members.
+enum class WalkFrom {
+    kNothing,         // the text names no place to list
+    kHostPath,        // the directory text, opened as the host wrote it
+    kEntry,           // the entry itself, opened relative to its directory
+    kEntryDirectory,  // the directory the entry is in: the walk's own
 };
 
-// Opens the walk of `wildcardText` at `entry`: for the host's own text the
-// directory is opened by its path; below it, the wildcard's directory must be
-// the directory `entry` is in, or `entry` itself, which is opened relative to
-// its directory. A link there is refused (`links` kRefuse) or followed and
-// marked in `throughLink` (kFollow). `throughLink` carries over from the
-// level above.
-Walk OpenWalk(const Place& entry, const char* wildcardText, Links links, bool throughLink);
+struct WalkPlan {
+    WalkFrom from = WalkFrom::kNothing;
+    std::string directory;        // the text to open, for kHostPath
+    std::string memberDirectory;  // what rvFilename joins member names to
+    std::string pattern;
+};
 
-// Calls `visit` with every entry of the open `directory` whose name matches
-// `pattern` (fnmatch with FNM_PATHNAME), in the order the platform lists
-// them; "." and ".." are left out. Entries removed or added meanwhile give
-// what the platform delivers.
-void ForEachEntry(int directory, const char* pattern, const std::function<void(const char* name)>& visit);
+// The walk of `wildcardText` at `entry`: for the host's own text the
+// directory is opened by its path; below it, the wildcard's directory must be
+// the directory `entry` is in, or `entry` itself.
+WalkPlan PlanWalk(const Place& entry, const char* wildcardText);
+
+// The names in one directory that match a pattern (fnmatch with
+// FNM_PATHNAME), "." and ".." left out, read at once in the order the
+// platform lists them: the listing holds no descriptor, and what the walk
+// changes in the directory meanwhile does not change the listing. An
+// unreadable directory lists nothing.
+class Listing {
+public:
+    Listing(int directory, const char* pattern);
+
+    // The next name and, in `type`, its dirent type (DT_UNKNOWN where the
+    // file system does not tell); null after the last one.
+    const char* Next(unsigned char* type);
+
+private:
+    std::string m_names;  // type byte, name, NUL; one after the other
+    size_t m_next = 0;
+};
+
+// The directories from the top of a walk down to where it works. Each was
+// opened relative to the one above it (the first as the host named it), and
+// is held open while few enough are; the others are closed on the way down
+// and reopened by name on the way back, from the nearest open one above, and
+// only if the names still lead to the same directory (device and inode). So
+// a walk holds a bounded number of descriptors however deep the tree.
+class DirectoryStack {
+public:
+    DirectoryStack() = default;
+    DirectoryStack(const DirectoryStack&) = delete;
+    DirectoryStack& operator=(const DirectoryStack&) = delete;
+
+    // Opens `place` as a directory and pushes it. `place.directory` is the
+    // descriptor of the deepest level (At(Depth() - 1)), or AT_FDCWD for the
+    // host's path on an empty stack. False, pushing nothing, when it cannot
+    // be opened, or when it is already on the stack (errno ELOOP).
+    bool Push(const Place& place, Links links);
+    void Pop();
+    size_t Depth() const { return m_levels.size(); }
+
+    // The descriptor of the directory at `level`, valid until the next Push
+    // or At; -1 when it had to be reopened and the names led elsewhere.
+    int At(size_t level);
+
+    // Whether the deepest directory of `other` is one of this stack's.
+    bool HoldsDeepestOf(const DirectoryStack& other) const;
+
+private:
+    struct Level {
+        DirectoryFd fd;
+        std::string name;
+        int flags;
+        dev_t device;
+        ino_t inode;
+    };
+
+    bool Holds(dev_t device, ino_t inode) const;
+    // Closes the shallowest open levels, never the first nor those from
+    // `limit` - 1 on, while `m_open` is at its bound.
+    void MakeRoom(size_t limit);
+
+    std::vector<Level> m_levels;
+    size_t m_open = 0;
+    // Levels from 1 up to here are closed.
+    size_t m_firstOpen = 1;
+};
 
 }  // namespace tessaline::files
 

@@ -8,16 +8,13 @@
 #include <gtest/gtest.h>
 
 #include "files/file_fixtures.h"
-#include "files/sys.h"
 #include "support/scoped_sys_calls.h"
 #include "util/sys.h"
-#include "files/sys_fakes.h"
 #include "support/temp_dir.h"
 #include "tessaline/files/rvCopy.h"
 
 using namespace tessaline::test;
 using tessaline::testing::ScopedSysCalls;
-using tessaline::files::Sys;
 
 namespace {
 
@@ -107,88 +104,6 @@ TEST(CopyFile, OntoItselfLeavesTheFileAlone)
     }
     EXPECT_EQ(0, Copy(dir / "d/*", dir / "d", 0, 1));
     EXPECT_EQ("precious", Slurp(source));
-}
-
-TEST(CopyFile, FailedCopyRemovesTheTargetAndKeepsTheSource)
-{
-    TempDir dir;
-    const std::string source = Put(dir / "source", std::string(50000, 's'));
-    const std::string target = dir / "target";
-    static int calls;
-    static const auto realRead = Sys().read;
-    static const auto realClose = Sys().close;
-    static const auto realKernelCopy = Sys().copy_file_range;
-    const struct {
-        const char* what;
-        void (*breakIt)();
-    } cases[] = {
-        {"the source ends early",
-         [] {
-             NoKernelCopy();
-             Sys().read = [](int fd, void* buffer, size_t count) -> ssize_t {
-                 return ++calls == 2 ? 0 : realRead(fd, buffer, count);
-             };
-         }},
-        {"the source ends early under the kernel copy",
-         [] {
-             Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t, unsigned int) -> ssize_t {
-                 return ++calls == 1 ? realKernelCopy(from, nullptr, to, nullptr, 1000, 0) : 0;
-             };
-             Sys().read = [](int, void*, size_t) -> ssize_t { return 0; };
-         }},
-        {"a write fails",
-         [] {
-             NoKernelCopy();
-             Sys().write = [](int, const void*, size_t) -> ssize_t { return -1; };
-         }},
-        {"the disk fills under the kernel copy",
-         [] {
-             Sys().copy_file_range = [](int, loff_t*, int, loff_t*, size_t, unsigned int) -> ssize_t {
-                 return Fail(ENOSPC);
-             };
-             Sys().write = [](int, const void*, size_t) -> ssize_t { return Fail(ENOSPC); };
-         }},
-        {"the target fails to close",
-         [] {
-             Sys().close = [](int fd) {
-                 realClose(fd);
-                 return ++calls == 2 ? -1 : 0;  // the source closes first
-             };
-         }},
-    };
-    for (const auto& c : cases) {
-        SCOPED_TRACE(c.what);
-        Put(target, "older target");
-        ScopedSysCalls restore(Sys());
-        calls = 0;
-        c.breakIt();
-        EXPECT_EQ(0, Copy(source, target, 0, 1, 0, 1));
-        EXPECT_FALSE(Exists(target));
-        EXPECT_EQ(50000u, Slurp(source).size());
-    }
-}
-
-TEST(CopyFile, TheLoopFinishesWhatTheKernelCopyLeaves)
-{
-    TempDir dir;
-    std::string content;
-    for (int i = 0; content.size() < 100000; ++i) {
-        content += std::to_string(i) + ",";
-    }
-    const std::string source = Put(dir / "source", content);
-    static int calls;
-    static const auto realKernelCopy = Sys().copy_file_range;
-    ScopedSysCalls restore(Sys());
-    calls = 0;
-    Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t, unsigned int) -> ssize_t {
-        return ++calls == 1 ? realKernelCopy(from, nullptr, to, nullptr, 12345, 0) : Fail(EXDEV);
-    };
-    EXPECT_EQ(1, Copy(source, dir / "target", 0, 1));
-    EXPECT_EQ(content, Slurp(dir / "target"));
-
-    NoKernelCopy();
-    EXPECT_EQ(1, Copy(source, dir / "again", 0, 1));
-    EXPECT_EQ(content, Slurp(dir / "again"));
 }
 
 TEST(CopyFile, LinksMovesAndRefusedSchemes)

@@ -13,8 +13,8 @@
 #include "tessaline/files/rvDirIterator.h"
 
 using namespace tessaline::test;
-using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
+using tessaline::testing::ScopedSysCalls;
 
 namespace {
 

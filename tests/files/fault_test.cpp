@@ -25,9 +25,9 @@
 #include "tessaline/files/rvFileApi.h"
 
 using namespace tessaline::test;
-using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
 using tessaline::files::SysCalls;
+using tessaline::testing::ScopedSysCalls;
 
 namespace {
 
@@ -179,6 +179,9 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
              return rvCopyFile(p.source.c_str(), (p.target + ".d/target").c_str(), 0, 1, 0, 0, nullptr, nullptr, 0644);
          },
          0, kOld},
+        {"source cannot be examined (fstat fails)", false,
+         [] { Sys().fstat = [](int, struct stat*) { return Fail(EIO); }; },
+         [](const Paths& p) { return CopyOver(p, 1); }, 0, kOld},
         {"up to date: never opened", false,
          [] { Sys().write = [](int, const void*, size_t) -> ssize_t { return Fail(ENOSPC); }; },
          [](const Paths& p) {
@@ -213,8 +216,32 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
          0, kMissing},
         {"file size limit, replacing a target", true, [] { LimitFileSize(20000); },
          [](const Paths& p) { return CopyOver(p, 1); }, 0, kMissing},
-        {"source size unknown (fstat fails)", false, [] { Sys().fstat = [](int, struct stat*) { return Fail(EIO); }; },
-         [](const Paths& p) { return CopyOver(p, 1); }, 0, kMissing},
+        {"the source ends early", false,
+         [] {
+             NoKernelCopy();
+             Sys().read = [](int fd, void* buffer, size_t count) -> ssize_t {
+                 static int reads = 0;
+                 return ++reads == 2 ? 0 : kReal.read(fd, buffer, count);
+             };
+         },
+         [](const Paths& p) { return CopyOver(p, 1, 1); }, 0, kMissing},
+        {"the source ends early under the kernel copy", false,
+         [] {
+             Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t, unsigned int) -> ssize_t {
+                 static int copies = 0;
+                 return ++copies == 1 ? kReal.copy_file_range(from, nullptr, to, nullptr, 1000, 0) : 0;
+             };
+             Sys().read = [](int, void*, size_t) -> ssize_t { return 0; };
+         },
+         [](const Paths& p) { return CopyOver(p, 1, 1); }, 0, kMissing},
+        {"the disk fills under the kernel copy", false,
+         [] {
+             Sys().copy_file_range = [](int, loff_t*, int, loff_t*, size_t, unsigned int) -> ssize_t {
+                 return Fail(ENOSPC);
+             };
+             Sys().write = [](int, const void*, size_t) -> ssize_t { return Fail(ENOSPC); };
+         },
+         [](const Paths& p) { return CopyOver(p, 1, 1); }, 0, kMissing},
         {"read fails (EIO)", false,
          [] {
              NoKernelCopy();
@@ -254,6 +281,17 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
              Sys().unlinkat = [](int, const char*, int) { return Fail(EBUSY); };
          },
          [](const Paths& p) { return CopyOver(p, 1); }, 0, ""},
+
+        // The byte loop finishes what the kernel copy leaves, or does it all.
+        {"the kernel copy stops part way", false,
+         [] {
+             Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t, unsigned int) -> ssize_t {
+                 static int copies = 0;
+                 return ++copies == 1 ? kReal.copy_file_range(from, nullptr, to, nullptr, 12345, 0) : Fail(EXDEV);
+             };
+         },
+         [](const Paths& p) { return CopyOver(p, 1); }, 1, kSource},
+        {"no kernel copy", false, NoKernelCopy, [](const Paths& p) { return CopyOver(p, 1); }, 1, kSource},
 
         // A move whose source cannot be removed still counts the copy.
         {"move, source stays (EBUSY)", false,

@@ -1,15 +1,25 @@
 // Trees that try to lead rvUnlink and the tree copy outside: names whose text
-// form reads as "..", symbolic links planted in the tree, and directories
-// swapped for links by another thread while the walk works.
+// form reads as "..", symbolic links planted in the tree, directories swapped
+// for links by another thread while the walk works, trees as deep as the
+// path limit allows, and links that lead back up the tree. Walks that used
+// to crash run in a child process, so a crash fails the test.
+#include <array>
 #include <atomic>
 #include <chrono>
 #include <filesystem>
 #include <map>
+#include <set>
 #include <string>
 #include <thread>
 #include <vector>
 
+#include <fcntl.h>
+#include <limits.h>
+#include <pthread.h>
 #include <stdio.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <gtest/gtest.h>
@@ -94,7 +104,133 @@ private:
     std::thread m_thread;
 };
 
+// Every path below `top`, relative, with "/" behind directories.
+std::set<std::string> Shape(const std::string& top)
+{
+    std::set<std::string> shape;
+    for (const auto& entry : std::filesystem::recursive_directory_iterator(top)) {
+        shape.insert(entry.path().lexically_relative(top).string() + (entry.is_directory() ? "/" : ""));
+    }
+    return shape;
+}
+
+// Runs `walks` in a child process on a thread with a 256 KiB stack and at
+// most 128 descriptors, as a small host thread would; the results it stores,
+// or -1 each when the child dies or runs for two minutes.
+template <size_t kCount>
+std::array<int, kCount> InSmallThread(void (*walks)(std::array<int, kCount>*))
+{
+    std::array<int, kCount> results;
+    results.fill(-1);
+    int channel[2];
+    if (pipe(channel) != 0) {
+        return results;
+    }
+    const pid_t child = fork();
+    if (child == 0) {
+        alarm(120);  // a walk that never ends fails too
+        const struct rlimit descriptors = {128, 128};
+        setrlimit(RLIMIT_NOFILE, &descriptors);
+        pthread_attr_t attributes;
+        pthread_attr_init(&attributes);
+        pthread_attr_setstacksize(&attributes, 256 * 1024);
+        static std::array<int, kCount> found;
+        static void (*run)(std::array<int, kCount>*) = walks;
+        pthread_t thread;
+        if (pthread_create(
+                &thread, &attributes,
+                [](void*) -> void* {
+                    run(&found);
+                    return nullptr;
+                },
+                nullptr) != 0 ||
+            pthread_join(thread, nullptr) != 0) {
+            _exit(2);
+        }
+        _exit(write(channel[1], found.data(), sizeof found) == sizeof found ? 0 : 1);
+    }
+    close(channel[1]);
+    if (read(channel[0], results.data(), sizeof results) != sizeof results) {
+        results.fill(-1);
+    }
+    close(channel[0]);
+    waitpid(child, nullptr, 0);
+    return results;
+}
+
+// The deep tree's places, fixed before the fork.
+std::string g_top;
+int g_levels = 0;
+
 }  // namespace
+
+TEST(HostileTree, DeepestTreeOnASmallStack)
+{
+    // Thousands of directories: in memory where the system offers it.
+    TempDir dir(access("/dev/shm", W_OK) == 0 ? "/dev/shm/" : ::testing::TempDir());
+    // "s/a/a/.../f": a file at every level, the deepest one exactly at the
+    // path limit, so that a target name one character longer passes it.
+    g_top = dir / (dir.path().size() % 2 == 0 ? "ss" : "s");
+    g_levels = static_cast<int>((PATH_MAX - 1 - 2 - g_top.size()) / 2);
+    ASSERT_EQ(0, mkdir(g_top.c_str(), 0755));
+    int fd = open(g_top.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    for (int level = 0; level <= g_levels; ++level) {
+        close(openat(fd, "f", O_WRONLY | O_CREAT | O_CLOEXEC, 0644));
+        if (level < g_levels) {
+            mkdirat(fd, "a", 0755);
+            const int deeper = openat(fd, "a", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+            close(fd);
+            fd = deeper;
+        }
+    }
+    close(fd);
+    ASSERT_EQ(PATH_MAX - 1, static_cast<int>(g_top.size()) + 2 * g_levels + 2);
+
+    const auto results = InSmallThread<6>([](std::array<int, 6>* found) {
+        const std::string same = g_top.substr(0, g_top.size() - 1) + "d";
+        const std::string longer = g_top + "d";
+        (*found)[0] = rvCopyFile(g_top.c_str(), same.c_str(), 1, 1, 0, 0, nullptr, nullptr, 0644);
+        (*found)[1] = rvCopyFile(g_top.c_str(), longer.c_str(), 1, 1, 0, 0, nullptr, nullptr, 0644);
+        (*found)[2] = CompareDirectoriesByFileSize(g_top.c_str(), same.c_str());
+        (*found)[3] = CompareDirectoriesByFileSize(g_top.c_str(), longer.c_str());
+        (*found)[4] = rvUnlink(same.c_str(), 1);
+        (*found)[5] = rvUnlink(longer.c_str(), 1) + rvUnlink(g_top.c_str(), 1);
+    });
+    const int files = g_levels + 1;
+    EXPECT_EQ((std::array<int, 6>{files, files - 1, 1, 0, files, files - 1 + files}), results)
+        << "copies, comparisons and removals of " << files << " levels; the deepest target name passes the limit";
+    EXPECT_FALSE(Exists(g_top)) << "all levels removed";
+}
+
+TEST(HostileTree, DirectoriesOnThePathAreNotEnteredAgain)
+{
+    TempDir dir;
+    g_top = dir.path();
+    Put(dir / "src/f", "file");
+    Put(dir / "src/sub/g", "deeper");
+    Put(dir / "src/x*", "a name read as a pattern of its own directory");
+    symlink(".", (dir / "src/loop").c_str());
+    symlink("..", (dir / "src/sub/up").c_str());
+    symlink("../sub", (dir / "src/sub/self").c_str());
+    Put(dir / "t/f", "copied into itself");
+    mkfifo((dir / "src/pipe").c_str(), 0644);  // copied as its size, without waiting for a writer
+
+    const auto results = InSmallThread<4>([](std::array<int, 4>* found) {
+        const std::string src = g_top + "/src";
+        (*found)[0] = rvCopyFile(src.c_str(), (g_top + "/dst").c_str(), 1, 1, 0, 0, nullptr, nullptr, 0644);
+        (*found)[1] = CompareDirectoriesByFileSize(src.c_str(), (g_top + "/dst").c_str());
+        (*found)[2] =
+            rvCopyFile((g_top + "/t").c_str(), (g_top + "/t/copy").c_str(), 1, 1, 0, 0, nullptr, nullptr, 0644);
+        CaptureStderr quiet;
+        (*found)[3] = rvUnlink(src.c_str(), 1);
+    });
+    EXPECT_EQ((std::array<int, 4>{3, 0, 1, 3}), results);
+    // Each link back up and the pattern member become an empty directory.
+    EXPECT_EQ((std::set<std::string>{"f", "pipe", "sub/", "sub/g", "loop/", "sub/up/", "sub/self/", "x*/"}),
+              Shape(dir / "dst"));
+    EXPECT_EQ((std::set<std::string>{"f", "copy/", "copy/f", "copy/copy/"}), Shape(dir / "t"));
+    EXPECT_EQ((std::set<std::string>{"x*"}), Shape(dir / "src")) << "links go as links; the pattern member stays";
+}
 
 TEST(HostileTree, NamesThatReadAsParentAreLeftAlone)
 {

@@ -19,8 +19,8 @@
 #include "tessaline/files/rvFilename.h"
 
 using namespace tessaline::test;
-using tessaline::testing::ScopedSysCalls;
 using tessaline::files::Sys;
+using tessaline::testing::ScopedSysCalls;
 
 namespace {
 
@@ -107,6 +107,8 @@ TEST(CompareDirectories, SecondMustCoverFirst)
     const std::string b = dir / "b";
     EXPECT_EQ(1, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "sizes, not contents";
     EXPECT_EQ(0, CompareDirectoriesByFileSize(b.c_str(), a.c_str())) << "one-way";
+    EXPECT_EQ(1, CompareDirectoriesByFileSize((dir.path() + "\\a").c_str(), (dir.path() + "\\b\\").c_str()))
+        << "backslashes separate as slashes do";
     EXPECT_EQ(1, CompareDirectoriesByFileSize((dir / "none").c_str(), b.c_str()));
     EXPECT_EQ(0, CompareDirectoriesByFileSize(a.c_str(), (dir / "none").c_str()));
     Put(dir / "b/sub/two", "longer");

@@ -7,6 +7,8 @@
 
 #include <gtest/gtest.h>
 
+#include "files/sys.h"
+#include "support/scoped_sys_calls.h"
 #include "support/temp_dir.h"
 #include "tessaline/files/rvSharedLib.h"
 
@@ -108,6 +110,36 @@ TEST_F(rvSharedLibTest, AssignmentOpensAnew)
     // No name: ".so" goes to the loader.
     second = rvSharedLib();
     EXPECT_EQ(second.IsValid(), 0);
+}
+
+TEST_F(rvSharedLibTest, LoaderFailuresKeepErrno)
+{
+    tessaline::testing::ScopedSysCalls restore(tessaline::files::Sys());
+    static int messagesRead = 0;
+    tessaline::files::Sys().dlerror = [] {
+        ++messagesRead;
+        return static_cast<char*>(nullptr);
+    };
+    tessaline::files::Sys().dlopen = [](const char*, int) -> void* {
+        errno = ENOEXEC;
+        return nullptr;
+    };
+    rvSharedLib lib(kPlugin.c_str(), 0);
+    EXPECT_EQ(lib.IsValid(), 0);
+    EXPECT_EQ(lib.m_error, ENOEXEC);
+    EXPECT_EQ(messagesRead, 1) << "the loader's message is read once and dropped";
+
+    // A failing dlclose still drops the handle.
+    static int fake = 0;
+    tessaline::files::Sys().dlopen = [](const char*, int) -> void* { return &fake; };
+    tessaline::files::Sys().dlclose = [](void*) {
+        errno = EBUSY;
+        return -1;
+    };
+    ASSERT_EQ(lib.Open(nullptr, RTLD_NOW, 0), 1);
+    EXPECT_EQ(lib.Close(), 0);
+    EXPECT_EQ(lib.m_error, EBUSY);
+    EXPECT_EQ(lib.IsValid(), 0);
 }
 
 }  // namespace

@@ -15,9 +15,10 @@ namespace tessaline::test {
 
 class TempDir {
 public:
-    TempDir()
+    // Under `base` (ending in "/"), by default the test's temporary area.
+    explicit TempDir(const std::string& base = ::testing::TempDir())
     {
-        std::string pattern = ::testing::TempDir() + "tessaline-XXXXXX";
+        std::string pattern = base + "tessaline-XXXXXX";
         if (mkdtemp(pattern.data()))
             m_path = std::filesystem::canonical(pattern).string();
         EXPECT_FALSE(m_path.empty()) << "mkdtemp " << pattern;

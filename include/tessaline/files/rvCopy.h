@@ -22,9 +22,26 @@
 /// share blocks with the source; its bytes are the same.
 ///
 /// Thread safety: no locks and no shared state; calls on separate trees are
-/// independent. A tree that changes during a walk gives what the platform's
-/// directory reading delivers. Recursion depth follows the depth of the tree,
-/// with a 16 KiB copy buffer on the stack of each level.
+/// independent. Each directory is listed once, when the walk enters it: a
+/// member added later is not seen, one removed meanwhile counts as missing.
+///
+/// Deep trees. The walks keep their place in a tree on the heap, not on the
+/// stack: a call needs the same few KiB of the host thread's stack (a 16 KiB
+/// copy buffer at most) however deep the tree, and holds at most 32 directory
+/// descriptors for each tree it walks, closing and reopening the others by
+/// name as it goes (only where they are still the same directory). A member
+/// whose text would pass the platform's path limit (PATH_MAX, 4096 with its
+/// NUL) is not reached: that branch ends there, as for any unreachable
+/// member.
+///
+/// Cycles. A walk never enters a directory that is already on its path (the
+/// same device and inode), whichever way it is reached: a symbolic link back
+/// up the tree, a bind mount, or a member whose name holds "*" or "?" and so
+/// reads as a pattern of its own directory. The copy also does not walk a
+/// source directory that it is writing into (a tree copied into itself).
+/// Such a member counts as one failure (0): the copy makes its target
+/// directory and leaves it empty; the comparison answers 0; removal, which
+/// follows no links, leaves a pattern-named member in place.
 ///
 /// Hostile trees. The path the host names (for a wildcard, its directory) is
 /// resolved as given. Everything below it is reached through the open
@@ -73,8 +90,8 @@
 /// non-zero makes a symbolic link instead of a copy (for a wildcard, first a
 /// link of the whole directory; if that fails, links member by member); an
 /// existing target makes it fail. `move` non-zero removes each source file
-/// after its copy; source directories stay. `aux1` and `aux2` are handed to
-/// the recursive calls and not read. `mode` is the permission of a target the
+/// after its copy; source directories stay. `aux1` and `aux2` are not read.
+/// `mode` is the permission of a target the
 /// call creates, under the umask; an existing target keeps its mode. Nothing
 /// else (time, owner) travels.
 ///
@@ -119,7 +136,11 @@ TESSALINE_API int rvUnlink(const char* path, unsigned int recurse);
 /// 1 when every entry under `first` has an entry of the same name, kind and
 /// size under `second`, recursively; else 0. One-way: entries only `second`
 /// has do not matter. Contents are never compared. A missing `first` walks
-/// nothing and gives 1; a missing `second` gives 0.
+/// nothing and gives 1; a missing `second` gives 0. A `first` ending in a
+/// pattern ("dir/*.log") compares only the matches. Links are followed on
+/// both sides; an entry that cannot be reached (past the path limit, a name
+/// whose text reads as another one, a directory already on its side's path)
+/// gives 0.
 TESSALINE_API int CompareDirectoriesByFileSize(const char* first, const char* second);
 
 /// The size of the file `path` names (backslashes accepted, symbolic links

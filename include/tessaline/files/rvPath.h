@@ -25,8 +25,9 @@ TESSALINE_EXTERN_C_BEGIN
  * component of rvFilename, so a bare relative name ("newdir") has the empty
  * name as parent and fails, while "old/new" works when "old" exists. An
  * existing name that cannot be examined (EACCES, ENOTDIR, ENAMETOOLONG)
- * gives 0 at once. Parents made before a deeper failure stay. `extra` is
- * passed down the recursion and otherwise unused; give 0.
+ * gives 0 at once. Parents made before a deeper failure stay. The parents
+ * are found in a loop, not by recursion, so the depth of `path` is limited
+ * only by the path limit. `extra` is not read; give 0.
  */
 TESSALINE_API int CreateDir(const char* path, long extra);
 
