@@ -81,6 +81,13 @@ private:
             EnterTree(place);
             return;
         }
+        // A listed file is unlinked at once: the read-only rule only matters
+        // for a file that does not go, and a file that goes keeps its mode for
+        // any other hard link to it, which may stand outside the tree.
+        if (type == DT_REG && Sys().unlinkat(place.directory, place.name, 0) == 0) {
+            ++m_total;
+            return;
+        }
         // One stat stands for `access` and the directory test (for mere
         // existence both fail alike) and tells whether the file is writable.
         struct stat info;
@@ -148,7 +155,7 @@ private:
             return;
         }
         const Place member{directory, name.c_str(), text.c_str()};
-        if (level.recurse == 0 && IsDirectoryAt(member) == 1) {
+        if (level.recurse == 0 && type != DT_REG && IsDirectoryAt(member) == 1) {
             return;
         }
         Visit(member, level.recurse, type);

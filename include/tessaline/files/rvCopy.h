@@ -123,7 +123,9 @@ TESSALINE_API int rvCopyFile(const char* source, const char* target, unsigned in
 /// exactly 1, a directory tree; returns the number of files removed
 /// (directories are not counted). A wildcard with `recurse` 0 leaves
 /// directories alone. A symbolic link to a directory is removed as a link. A
-/// read-only file is made writable first. A file that cannot be removed makes
+/// read-only file that is not removed at the first try is made writable
+/// (members of a tree are tried first, so a file that goes keeps its mode
+/// for any other hard link to it). A file that cannot be removed makes
 /// one line on the standard error stream,
 /// "rvUnlink: Could not remove <path>: <platform text> (<errno>).", and adds 0;
 /// so does a directory given with `recurse` other than 1. Missing paths and
