@@ -186,11 +186,7 @@ void ReadPass(rvConfig& config)
         if (keys == nullptr) {
             keys = &SectionKeys(config, running);
         }
-        const std::pair<rvConfig::KeyTable::iterator, bool> added =
-            keys->insert(rvConfig::KeyTable::value_type(keyNames.Get(key), rvConfig::cfgStr()));
-        if (added.second) {
-            added.first->second = rvConfig::cfgStr(value);
-        }
+        keys->try_emplace(keyNames.Get(key), value);
         ++config.m_nItems;
     }
     config.Close(0);

@@ -7,7 +7,6 @@
 
 #include <unistd.h>
 
-#include "config/borrowed_name.h"
 #include "config/class_lock.h"
 #include "config/config_name.h"
 #include "config/passes.h"
@@ -107,7 +106,7 @@ void MergeKeyLine(rvConfig& config, Output& out, char* text, const rvConfig::cfg
     if (section == config.m_sections.end()) {
         return;
     }
-    section->second.erase(BorrowedName(key));
+    section->second.erase(key);
     if (section->second.empty()) {
         // A copy: removing the current section may replace m_strSection.
         const rvConfig::cfgStr emptied = name;
