@@ -129,8 +129,9 @@ unsigned int tessaline::config::FindValue(rvConfig& config, const NameText& key,
                                           const NameText& section)
 {
     ScopedClassLock lock;
-    rvConfig::SectionTable::value_type* found =
-        section.empty() ? NameText(config.m_strSection).In(config.m_sections) : section.In(config.m_sections);
+    // Callers look many keys up in one section in a row.
+    const NameText& name = section.empty() ? NameText(config.m_strSection) : section;
+    rvConfig::SectionTable::value_type* found = name.InRecent(config.m_sections);
     if (found == nullptr) {
         return 0;
     }

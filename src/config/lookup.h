@@ -11,24 +11,41 @@ namespace tessaline::config {
 
 // A caller's name as the tables look it up: no copy, no allocation. The
 // text must outlive it. Null is "".
-struct NameText {
-    explicit NameText(const char* name)
-        : text(name != nullptr ? name : ""), length(std::strlen(text)), fold(FoldedNameHash(text, length))
+class NameText {
+public:
+    explicit NameText(const char* name) : m_text(name != nullptr ? name : ""), m_length(std::strlen(m_text)) {}
+    explicit NameText(const rvConfig::cfgStr& name)
+        : m_text(name.c_str()), m_length(name.size()), m_fold(name.FoldHash())
     {
     }
-    explicit NameText(const rvConfig::cfgStr& name) : text(name.c_str()), length(name.size()), fold(name.FoldHash()) {}
 
     template <class Table>
     typename Table::value_type* In(const Table& table) const
     {
-        return table.FindEntry(text, length, fold);
+        return table.FindEntry(m_text, m_length, Fold());
     }
 
-    bool empty() const { return length == 0; }
+    // For the name asked for many times in a row.
+    template <class Table>
+    typename Table::value_type* InRecent(const Table& table) const
+    {
+        return table.FindRecent(m_text, m_length, [this] { return Fold(); });
+    }
 
-    const char* text;
-    std::size_t length;
-    unsigned int fold;
+    bool empty() const { return m_length == 0; }
+
+private:
+    unsigned int Fold() const
+    {
+        if (m_fold == 0) {
+            m_fold = FoldedNameHash(m_text, m_length);
+        }
+        return m_fold;
+    }
+
+    const char* m_text;
+    std::size_t m_length;
+    mutable unsigned int m_fold = 0;
 };
 
 // _GetValue without copies of its names: 1 and the value in *value, or 0

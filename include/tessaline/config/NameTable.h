@@ -37,6 +37,7 @@
 #ifndef TESSALINE_CONFIG_NAMETABLE_H
 #define TESSALINE_CONFIG_NAMETABLE_H
 
+#include <atomic>
 #include <cstddef>
 #include <cstring>
 #include <iterator>
@@ -235,6 +236,9 @@ public:
         std::swap(m_blocks, other.m_blocks);
         std::swap(m_unused, other.m_unused);
         std::swap(m_unusedEnd, other.m_unusedEnd);
+        Node* recent = m_recent.load(std::memory_order_relaxed);
+        m_recent.store(other.m_recent.load(std::memory_order_relaxed), std::memory_order_relaxed);
+        other.m_recent.store(recent, std::memory_order_relaxed);
     }
 
     /// The entry with the name `text` of `length` bytes whose FoldedNameHash
@@ -243,6 +247,22 @@ public:
     value_type* FindEntry(const char* text, size_type length, unsigned int fold) const
     {
         Node* node = FindNode(text, length, fold);
+        return node != nullptr ? &node->value : nullptr;
+    }
+
+    /// As FindEntry, for a caller that asks for the same name many times
+    /// in a row: the entry found last is compared first, and its hash is not
+    /// computed again. `fold` gives FoldedNameHash of the name when needed.
+    template <class Fold>
+    value_type* FindRecent(const char* text, size_type length, Fold fold) const
+    {
+        Node* recent = m_recent.load(std::memory_order_relaxed);
+        if (recent != nullptr && !m_ambiguous && strcasecmp(recent->value.first.c_str(), text) == 0 &&
+            AsciiCaseFolding()) {
+            return &recent->value;
+        }
+        Node* node = FindNode(text, length, fold());
+        m_recent.store(node, std::memory_order_relaxed);
         return node != nullptr ? &node->value : nullptr;
     }
 
@@ -283,8 +303,12 @@ private:
             return slot;
         }
         if (m_unused == m_unusedEnd) {
-            size_type nodes = expected < kSmallestBlock ? kSmallestBlock : expected;
-            if (nodes > kLargestBlock && expected == m_size + 1) {
+            // A table that grows one entry at a time gets blocks of half its
+            // size, which wastes at most a third; a copy gets one block.
+            size_type nodes = expected == m_size + 1 ? expected / 2 : expected;
+            if (nodes < kSmallestBlock) {
+                nodes = kSmallestBlock;
+            } else if (nodes > kLargestBlock && expected == m_size + 1) {
                 nodes = kLargestBlock;
             }
             char* raw = static_cast<char*>(::operator new(kNodeOffset + nodes * sizeof(Node)));
@@ -331,6 +355,7 @@ private:
         }
         m_free = nullptr;
         m_unused = m_unusedEnd = nullptr;
+        m_recent.store(nullptr, std::memory_order_relaxed);
     }
 
     size_type BucketOf(unsigned int bucketHash) const { return bucketHash % m_bucketCount; }
@@ -403,7 +428,7 @@ private:
     }
 
     // The index: linear probing on the folded hash over a power of two of
-    // slots, at most half full.
+    // slots, at most four fifths full.
     void IndexAdd(Node* node)
     {
         size_type i = node->foldHash & m_slotMask;
@@ -416,7 +441,7 @@ private:
     void GrowIndex(size_type entries)
     {
         size_type capacity = 16;
-        while (capacity < entries * 2) {
+        while (capacity < entries + entries / 4) {
             capacity *= 2;
         }
         if (capacity <= m_slotMask + 1 && m_slots != nullptr) {
@@ -543,6 +568,9 @@ private:
         if (node == nullptr) {
             return 0;
         }
+        if (node == m_recent.load(std::memory_order_relaxed)) {
+            m_recent.store(nullptr, std::memory_order_relaxed);
+        }
         Unlink(node);
         IndexRemove(node);
         FreeNode(node);
@@ -588,6 +616,9 @@ private:
     // Set when two entries with A-Z-equal names were stored under a locale
     // that told them apart: the index can no longer pick between them.
     bool m_ambiguous = false;
+    // The entry FindRecent found last. Atomic only so that finds, which
+    // callers may run side by side on one table, never race on it.
+    mutable std::atomic<Node*> m_recent{nullptr};
     FreeSlot* m_free = nullptr;
     Block* m_blocks = nullptr;
     char* m_unused = nullptr;
