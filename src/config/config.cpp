@@ -84,7 +84,7 @@ rvConfig::operator const char*()
 
 unsigned int rvConfig::Section(const char* name, unsigned int create)
 {
-    if (NameText(name).In(m_sections) == nullptr) {
+    if (NameText(name).In(m_sections) == m_sections.end()) {
         if (create == 0) {
             return 0;
         }
@@ -131,12 +131,12 @@ unsigned int tessaline::config::FindValue(rvConfig& config, const NameText& key,
     ScopedClassLock lock;
     // Callers look many keys up in one section in a row.
     const NameText& name = section.empty() ? NameText(config.m_strSection) : section;
-    rvConfig::SectionTable::value_type* found = name.InRecent(config.m_sections);
-    if (found == nullptr) {
+    const rvConfig::SectionTable::iterator found = name.InRecent(config.m_sections);
+    if (found == config.m_sections.end()) {
         return 0;
     }
-    const rvConfig::KeyTable::value_type* entry = key.In(found->second);
-    if (entry == nullptr) {
+    const rvConfig::KeyTable::iterator entry = key.In(found->second);
+    if (entry == found->second.end()) {
         return 0;
     }
     *value = entry->second;

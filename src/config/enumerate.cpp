@@ -43,8 +43,8 @@ const char* rvConfig::EnumTokens(const char* section, unsigned int first)
 
 unsigned int rvConfig::TokenCnt(const char* section)
 {
-    const SectionTable::value_type* found = tessaline::config::NameText(section).In(m_sections);
-    return found == nullptr ? 0 : static_cast<unsigned int>(found->second.size());
+    const SectionTable::iterator found = tessaline::config::NameText(section).In(m_sections);
+    return found == m_sections.end() ? 0 : static_cast<unsigned int>(found->second.size());
 }
 
 unsigned int rvConfig::SectionCnt()

@@ -19,15 +19,16 @@ public:
     {
     }
 
+    // The iterator of the entry in `table`, or its end().
     template <class Table>
-    typename Table::value_type* In(const Table& table) const
+    auto In(Table& table) const
     {
         return table.FindEntry(m_text, m_length, Fold());
     }
 
-    // For the name asked for many times in a row.
+    // For a name asked for many times in a row, or just found.
     template <class Table>
-    typename Table::value_type* InRecent(const Table& table) const
+    auto InRecent(Table& table) const
     {
         return table.FindRecent(m_text, m_length, [this] { return Fold(); });
     }

@@ -37,8 +37,9 @@ rvConfig::cfgStr::cfgStr(const char* text, std::size_t length)
     if (block == nullptr) {
         throw std::bad_alloc();
     }
-    m_text = ::new (block) Text{{1}, static_cast<unsigned int>(length), {0}};
-    char* chars = reinterpret_cast<char*>(m_text + 1);
+    Text* shared = ::new (block) Text{{1}, static_cast<unsigned int>(length), {0}};
+    Adopt(shared);
+    char* chars = reinterpret_cast<char*>(shared + 1);
     std::memcpy(chars, text, length);
     chars[length] = '\0';
 }
@@ -60,16 +61,17 @@ rvConfig::cfgStr::cfgStr(const __gnu_cxx::crope& text)
     shared->refs.store(1, std::memory_order_relaxed);
     shared->length = static_cast<unsigned int>(length) | kRopeText;
     shared->foldHash.store(0, std::memory_order_relaxed);
-    m_text = shared;
+    Adopt(shared);
 }
 
 rvConfig::cfgStr::operator __gnu_cxx::crope() const
 {
-    if (m_text == nullptr) {
+    const Text* text = Get();
+    if (text == nullptr) {
         return __gnu_cxx::crope();
     }
-    if ((m_text->length & kRopeText) != 0) {
-        return static_cast<const RopeText*>(m_text)->rope;
+    if ((text->length & kRopeText) != 0) {
+        return static_cast<const RopeText*>(text)->rope;
     }
     return __gnu_cxx::crope(c_str(), size());
 }

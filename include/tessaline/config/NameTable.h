@@ -38,6 +38,7 @@
 #define TESSALINE_CONFIG_NAMETABLE_H
 
 #include <atomic>
+#include <algorithm>
 #include <cstddef>
 #include <cstring>
 #include <iterator>
@@ -67,6 +68,12 @@ TESSALINE_API bool AsciiFoldedEqual(const char* a, const char* b) noexcept;
 /// The classic extension hash_map's bucket counts: the first not below
 /// `wanted`, or the largest.
 TESSALINE_API std::size_t NextBucketCount(std::size_t wanted) noexcept;
+
+/// Asks for a copy that shares its names and values without counting the
+/// references: it must be gone before the original's entries go or change.
+/// Flush works on such a copy so that the table it gives back is the one it
+/// took, untouched.
+struct BorrowingCopy {};
 
 template <class Key, class Mapped, class BucketHash, class Equal>
 class NameTable {
@@ -133,7 +140,12 @@ public:
     /// Empty, with room for `hint` entries before growing (193 buckets for
     /// the default hint of 100).
     explicit NameTable(size_type hint = 100) { m_bucketCount = NextBucketCount(hint); }
-    NameTable(const NameTable& other) : m_bucketCount(other.m_bucketCount) { CopyFrom(other); }
+    NameTable(const NameTable& other) : m_bucketCount(other.m_bucketCount) { CopyFrom(other, Counted()); }
+    /// A copy whose entries borrow those of `other` (see BorrowingCopy).
+    NameTable(const NameTable& other, BorrowingCopy borrowing) : m_bucketCount(other.m_bucketCount)
+    {
+        CopyFrom(other, borrowing);
+    }
     NameTable(NameTable&& other) noexcept : m_bucketCount(NextBucketCount(100)) { swap(other); }
     NameTable& operator=(const NameTable& other)
     {
@@ -229,6 +241,7 @@ public:
         std::swap(m_buckets, other.m_buckets);
         std::swap(m_bucketCount, other.m_bucketCount);
         std::swap(m_slots, other.m_slots);
+        std::swap(m_tags, other.m_tags);
         std::swap(m_slotMask, other.m_slotMask);
         std::swap(m_size, other.m_size);
         std::swap(m_ambiguous, other.m_ambiguous);
@@ -242,28 +255,29 @@ public:
     }
 
     /// The entry with the name `text` of `length` bytes whose FoldedNameHash
-    /// is `fold`, or null: the lookup without a key for the library's own
-    /// passes.
-    value_type* FindEntry(const char* text, size_type length, unsigned int fold) const
+    /// is `fold`, or end(): the lookup without a key for the library's own
+    /// passes. The entry found is remembered for FindRecent.
+    iterator FindEntry(const char* text, size_type length, unsigned int fold)
     {
-        Node* node = FindNode(text, length, fold);
-        return node != nullptr ? &node->value : nullptr;
+        return iterator(Remember(FindNode(text, length, fold)), this);
+    }
+    const_iterator FindEntry(const char* text, size_type length, unsigned int fold) const
+    {
+        return const_iterator(Remember(FindNode(text, length, fold)), this);
     }
 
-    /// As FindEntry, for a caller that asks for the same name many times
-    /// in a row: the entry found last is compared first, and its hash is not
-    /// computed again. `fold` gives FoldedNameHash of the name when needed.
+    /// As FindEntry, for a caller that asks for one name many times in a
+    /// row: the entry found last is compared first, and the name's hash is
+    /// not computed for it. `fold()` gives FoldedNameHash of the name.
     template <class Fold>
-    value_type* FindRecent(const char* text, size_type length, Fold fold) const
+    iterator FindRecent(const char* text, size_type length, Fold fold)
     {
-        Node* recent = m_recent.load(std::memory_order_relaxed);
-        if (recent != nullptr && !m_ambiguous && strcasecmp(recent->value.first.c_str(), text) == 0 &&
-            AsciiCaseFolding()) {
-            return &recent->value;
-        }
-        Node* node = FindNode(text, length, fold());
-        m_recent.store(node, std::memory_order_relaxed);
-        return node != nullptr ? &node->value : nullptr;
+        return iterator(FindRecentNode(text, length, fold), this);
+    }
+    template <class Fold>
+    const_iterator FindRecent(const char* text, size_type length, Fold fold) const
+    {
+        return const_iterator(FindRecentNode(text, length, fold), this);
     }
 
 private:
@@ -335,7 +349,7 @@ private:
     void Release() noexcept
     {
         if (m_buckets != nullptr) {
-            for (size_type b = 0; b < m_bucketCount; ++b) {
+            for (size_type b = 0; m_size != 0 && b < m_bucketCount; ++b) {
                 for (Node* node = m_buckets[b]; node != nullptr;) {
                     Node* next = node->next;
                     node->~Node();
@@ -345,8 +359,9 @@ private:
             delete[] m_buckets;
             m_buckets = nullptr;
         }
-        delete[] m_slots;
+        ::operator delete(static_cast<void*>(m_slots));
         m_slots = nullptr;
+        m_tags = nullptr;
         m_slotMask = 0;
         while (m_blocks != nullptr) {
             Block* next = m_blocks->next;
@@ -428,7 +443,10 @@ private:
     }
 
     // The index: linear probing on the folded hash over a power of two of
-    // slots, at most four fifths full.
+    // slots, at most four fifths full. Beside each slot its hash's top half,
+    // so that a probe reads a node only when that matches.
+    static unsigned short TagOf(unsigned int fold) { return static_cast<unsigned short>(fold >> 16); }
+
     void IndexAdd(Node* node)
     {
         size_type i = node->foldHash & m_slotMask;
@@ -436,6 +454,7 @@ private:
             i = (i + 1) & m_slotMask;
         }
         m_slots[i] = node;
+        m_tags[i] = TagOf(node->foldHash);
     }
 
     void GrowIndex(size_type entries)
@@ -447,10 +466,13 @@ private:
         if (capacity <= m_slotMask + 1 && m_slots != nullptr) {
             return;
         }
-        Node** slots = new Node*[capacity]();
+        void* block = ::operator new(capacity*(sizeof(Node*) + sizeof(unsigned short)));
+        Node** slots = static_cast<Node**>(block);
+        std::fill(slots, slots + capacity, nullptr);
         Node** old = m_slots;
         const size_type oldCapacity = m_slotMask + 1;
         m_slots = slots;
+        m_tags = reinterpret_cast<unsigned short*>(slots + capacity);
         m_slotMask = capacity - 1;
         if (old != nullptr) {
             for (size_type i = 0; i < oldCapacity; ++i) {
@@ -458,7 +480,7 @@ private:
                     IndexAdd(old[i]);
                 }
             }
-            delete[] old;
+            ::operator delete(static_cast<void*>(old));
         }
     }
 
@@ -475,10 +497,28 @@ private:
             // hole (cyclically) up to j.
             if (((j - home) & m_slotMask) >= ((j - i) & m_slotMask)) {
                 m_slots[i] = m_slots[j];
+                m_tags[i] = m_tags[j];
                 i = j;
             }
         }
         m_slots[i] = nullptr;
+    }
+
+    Node* Remember(Node* node) const
+    {
+        m_recent.store(node, std::memory_order_relaxed);
+        return node;
+    }
+
+    template <class Fold>
+    Node* FindRecentNode(const char* text, size_type length, Fold fold) const
+    {
+        Node* recent = m_recent.load(std::memory_order_relaxed);
+        if (recent != nullptr && !m_ambiguous && strcasecmp(recent->value.first.c_str(), text) == 0 &&
+            AsciiCaseFolding()) {
+            return recent;
+        }
+        return Remember(FindNode(text, length, fold()));
     }
 
     Node* FindText(const char* text) const
@@ -498,12 +538,13 @@ private:
             return nullptr;
         }
         if (!m_ambiguous && AsciiCaseFolding()) {
+            const unsigned short tag = TagOf(fold);
             for (size_type i = fold & m_slotMask;; i = (i + 1) & m_slotMask) {
                 Node* node = m_slots[i];
                 if (node == nullptr) {
                     return nullptr;
                 }
-                if (node->foldHash == fold && strcasecmp(node->value.first.c_str(), text) == 0) {
+                if (m_tags[i] == tag && node->foldHash == fold && strcasecmp(node->value.first.c_str(), text) == 0) {
                     return node;
                 }
             }
@@ -580,8 +621,22 @@ private:
         return 1;
     }
 
+    // How CopyFrom makes each entry: a plain copy, or a borrowing one.
+    struct Counted {};
+    static Node* MakeNode(void* storage, const Node& from, Counted)
+    {
+        return ::new (storage) Node(from.bucketHash, from.foldHash, from.value);
+    }
+    static Node* MakeNode(void* storage, const Node& from, BorrowingCopy borrowing)
+    {
+        return ::new (storage) Node(from.bucketHash, from.foldHash, std::piecewise_construct,
+                                    std::forward_as_tuple(from.value.first, borrowing),
+                                    std::forward_as_tuple(from.value.second, borrowing));
+    }
+
     // Same bucket count, every chain in its order.
-    void CopyFrom(const NameTable& other)
+    template <class How>
+    void CopyFrom(const NameTable& other, How how)
     {
         if (other.m_size == 0) {
             return;
@@ -592,7 +647,7 @@ private:
             for (size_type b = 0; b < m_bucketCount; ++b) {
                 Node** tail = &m_buckets[b];
                 for (const Node* from = other.m_buckets[b]; from != nullptr; from = from->next) {
-                    Node* node = ::new (AllocateNode(other.m_size)) Node(from->bucketHash, from->foldHash, from->value);
+                    Node* node = MakeNode(AllocateNode(other.m_size), *from, how);
                     node->link = tail;
                     *tail = node;
                     tail = &node->next;
@@ -611,12 +666,13 @@ private:
     Node** m_buckets = nullptr;
     size_type m_bucketCount = 0;
     Node** m_slots = nullptr;
+    unsigned short* m_tags = nullptr;
     size_type m_slotMask = 0;
     size_type m_size = 0;
     // Set when two entries with A-Z-equal names were stored under a locale
     // that told them apart: the index can no longer pick between them.
     bool m_ambiguous = false;
-    // The entry FindRecent found last. Atomic only so that finds, which
+    // The entry FindEntry or FindRecent found last. Atomic only so that finds, which
     // callers may run side by side on one table, never race on it.
     mutable std::atomic<Node*> m_recent{nullptr};
     FreeSlot* m_free = nullptr;

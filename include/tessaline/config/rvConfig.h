@@ -45,6 +45,7 @@
 
 #include <atomic>
 #include <cstddef>
+#include <cstdint>
 #include <cstdio>
 #include <cstring>
 #include <strings.h>
@@ -86,56 +87,68 @@ public:
         /// Shares the rope's text; copies no characters.
         cfgStr(const __gnu_cxx::crope& text);
         /// Shares `other`'s text.
-        cfgStr(const cfgStr& other) noexcept : m_text(other.m_text)
+        cfgStr(const cfgStr& other) noexcept : m_bits(other.m_bits & ~kBorrowed) { Hold(); }
+        /// Shares `source`'s text without counting it: valid only while the
+        /// text is held elsewhere. Tables make such references for Flush's
+        /// working copy; any copy or move of one counts as usual.
+        cfgStr(const cfgStr& source, tessaline::config::BorrowingCopy) noexcept
+            : m_bits(source.m_bits == 0 ? 0 : source.m_bits | kBorrowed)
         {
-            if (m_text != nullptr) {
-                m_text->refs.fetch_add(1, std::memory_order_relaxed);
-            }
         }
         /// Takes `other`'s text and leaves `other` empty.
-        cfgStr(cfgStr&& other) noexcept : m_text(other.m_text) { other.m_text = nullptr; }
+        cfgStr(cfgStr&& other) noexcept : m_bits(other.m_bits)
+        {
+            other.m_bits = 0;
+            if ((m_bits & kBorrowed) != 0) {
+                m_bits &= ~kBorrowed;
+                Hold();
+            }
+        }
         ~cfgStr()
         {
-            if (m_text != nullptr) {
-                Drop(m_text);
+            if (m_bits != 0 && (m_bits & kBorrowed) == 0) {
+                Drop(Get());
             }
         }
         /// Shares `other`'s text and drops the old one.
         cfgStr& operator=(const cfgStr& other) noexcept
         {
             cfgStr copy(other);
-            swap(copy);
+            copy.SwapBits(*this);
             return *this;
         }
-        /// Exchanges the texts: `other` receives the old one.
+        /// Takes `other`'s text, leaves `other` empty and drops the old one.
         cfgStr& operator=(cfgStr&& other) noexcept
         {
-            swap(other);
+            cfgStr taken(std::move(other));
+            taken.SwapBits(*this);
             return *this;
         }
+        /// Exchanges the texts.
         void swap(cfgStr& other) noexcept
         {
-            Text* text = m_text;
-            m_text = other.m_text;
-            other.m_text = text;
+            cfgStr mine(std::move(*this));
+            *this = std::move(other);
+            other = std::move(mine);
         }
 
         /// The text, NUL-terminated; "" when empty, never null. Valid while
         /// any cfgStr shares this text.
         const char* c_str() const noexcept
         {
-            if (m_text == nullptr) {
+            const Text* text = Get();
+            if (text == nullptr) {
                 return "";
             }
-            if ((m_text->length & kRopeText) != 0) {
-                return RopeChars(m_text);
+            if ((text->length & kRopeText) != 0) {
+                return RopeChars(text);
             }
-            return reinterpret_cast<const char*>(m_text + 1);
+            return reinterpret_cast<const char*>(text + 1);
         }
         /// The length of c_str().
-        std::size_t size() const noexcept { return m_text == nullptr ? 0 : m_text->length & ~kRopeText; }
+        std::size_t size() const noexcept { return m_bits == 0 ? 0 : Get()->length & ~kRopeText; }
         std::size_t length() const noexcept { return size(); }
-        bool empty() const noexcept { return m_text == nullptr; }
+        bool empty() const noexcept { return m_bits == 0; }
 
         /// The text as a rope: shared when it came from a rope, else copied.
         operator __gnu_cxx::crope() const;
@@ -144,11 +157,12 @@ public:
         /// after its first use.
         unsigned int FoldHash() const noexcept
         {
-            if (m_text == nullptr) {
+            Text* text = Get();
+            if (text == nullptr) {
                 return tessaline::config::FoldedNameHash("", 0);
             }
-            const unsigned int fold = m_text->foldHash.load(std::memory_order_relaxed);
-            return fold != 0 ? fold : StoreFoldHash(m_text);
+            const unsigned int fold = text->foldHash.load(std::memory_order_relaxed);
+            return fold != 0 ? fold : StoreFoldHash(text);
         }
 
     private:
@@ -162,6 +176,24 @@ public:
         static constexpr unsigned int kRopeText = 0x80000000u;
         struct RopeText;
 
+        // The low bit of m_bits marks a reference that does not count.
+        static constexpr std::uintptr_t kBorrowed = 1;
+
+        Text* Get() const noexcept { return reinterpret_cast<Text*>(m_bits & ~kBorrowed); }
+        void Hold() const noexcept
+        {
+            if (m_bits != 0) {
+                Get()->refs.fetch_add(1, std::memory_order_relaxed);
+            }
+        }
+        void SwapBits(cfgStr& other) noexcept
+        {
+            const std::uintptr_t bits = m_bits;
+            m_bits = other.m_bits;
+            other.m_bits = bits;
+        }
+        void Adopt(Text* text) noexcept { m_bits = reinterpret_cast<std::uintptr_t>(text); }
+
         static void Drop(Text* text) noexcept
         {
             if (text->refs.fetch_sub(1, std::memory_order_acq_rel) == 1) {
@@ -172,7 +204,7 @@ public:
         static const char* RopeChars(const Text* text) noexcept;
         static unsigned int StoreFoldHash(Text* text) noexcept;
 
-        Text* m_text = nullptr;
+        std::uintptr_t m_bits = 0;
     };
 
     /// The name hash of both table levels.
