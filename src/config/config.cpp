@@ -84,14 +84,17 @@ rvConfig::operator const char*()
 
 unsigned int rvConfig::Section(const char* name, unsigned int create)
 {
-    if (NameText(name).In(m_sections) == m_sections.end()) {
-        if (create == 0) {
-            return 0;
-        }
-        m_sections.insert(SectionTable::value_type(cfgStr(name), KeyTable()));
-        ++m_nItems;
+    if (NameText(name).In(m_sections) != m_sections.end()) {
+        m_strSection = cfgStr(name);
+        return 1;
     }
-    m_strSection = cfgStr(name);
+    if (create == 0) {
+        return 0;
+    }
+    cfgStr section(name);
+    m_sections.insert(SectionTable::value_type(section, KeyTable()));
+    ++m_nItems;
+    m_strSection = std::move(section);
     return 1;
 }
 

@@ -223,7 +223,7 @@ public:
     /// Removes every entry; the bucket count stays.
     void clear()
     {
-        Release();
+        Release(true);
         m_size = 0;
         m_ambiguous = false;
     }
@@ -301,7 +301,7 @@ private:
         Block* next;
     };
     static constexpr size_type kNodeOffset = (sizeof(Block) + alignof(Node) - 1) / alignof(Node) * alignof(Node);
-    static constexpr size_type kSmallestBlock = 8;
+    static constexpr size_type kSmallestBlock = 16;
     static constexpr size_type kLargestBlock = 1024;
 
     // An erased node's storage, waiting for reuse.
@@ -345,24 +345,34 @@ private:
         FreeStorage(node);
     }
 
-    // Frees every node and block, buckets and index included.
-    void Release() noexcept
+    // Frees every node and block, and the buckets and index unless the
+    // table is to be used again.
+    void Release(bool keepArrays = false) noexcept
     {
         if (m_buckets != nullptr) {
-            for (size_type b = 0; m_size != 0 && b < m_bucketCount; ++b) {
-                for (Node* node = m_buckets[b]; node != nullptr;) {
+            size_type left = m_size;
+            for (size_type b = 0; left != 0 && b < m_bucketCount; ++b) {
+                for (Node* node = m_buckets[b]; node != nullptr; --left) {
                     Node* next = node->next;
                     node->~Node();
                     node = next;
                 }
             }
-            delete[] m_buckets;
-            m_buckets = nullptr;
+            if (keepArrays) {
+                std::fill(m_buckets, m_buckets + m_bucketCount, nullptr);
+            } else {
+                delete[] m_buckets;
+                m_buckets = nullptr;
+            }
         }
-        ::operator delete(static_cast<void*>(m_slots));
-        m_slots = nullptr;
-        m_tags = nullptr;
-        m_slotMask = 0;
+        if (keepArrays && m_slots != nullptr) {
+            std::fill(m_slots, m_slots + m_slotMask + 1, nullptr);
+        } else {
+            ::operator delete(static_cast<void*>(m_slots));
+            m_slots = nullptr;
+            m_tags = nullptr;
+            m_slotMask = 0;
+        }
         while (m_blocks != nullptr) {
             Block* next = m_blocks->next;
             ::operator delete(static_cast<void*>(m_blocks));
