@@ -70,7 +70,8 @@ public:
     /// empty string is held as a null reference, which is what "empty" means
     /// for a section argument. Built from a `const char*`, it copies the
     /// characters; a null pointer is taken as "". Built from a rope, it
-    /// shares the rope's text, and turns back into a rope that shares it too.
+    /// shares the rope's text, and turns back into a rope that shares it too;
+    /// it is not itself a rope, so its copies never take the rope's lock.
     ///
     /// The key and value type of the tables. The reference count is atomic,
     /// so copies of one text may live in different threads; a single cfgStr
