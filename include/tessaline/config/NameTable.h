@@ -65,6 +65,20 @@ TESSALINE_API bool AsciiCaseFolding() noexcept;
 /// Whether `a` and `b` are equal with A-Z folded to lower case.
 TESSALINE_API bool AsciiFoldedEqual(const char* a, const char* b) noexcept;
 
+/// Whether the `length` bytes at `a` and at `b` are equal with A-Z folded to
+/// lower case. Inline: the tables' lookups end in it.
+inline bool AsciiFoldedEqual(const char* a, const char* b, std::size_t length) noexcept
+{
+    for (std::size_t i = 0; i < length; ++i) {
+        const unsigned int x = static_cast<unsigned char>(a[i]);
+        const unsigned int y = static_cast<unsigned char>(b[i]);
+        if (x != y && ((x ^ y) != 0x20 || (x | 0x20) < 'a' || (x | 0x20) > 'z')) {
+            return false;
+        }
+    }
+    return true;
+}
+
 /// The classic extension hash_map's bucket counts: the first not below
 /// `wanted`, or the largest.
 TESSALINE_API std::size_t NextBucketCount(std::size_t wanted) noexcept;
@@ -524,11 +538,17 @@ private:
     Node* FindRecentNode(const char* text, size_type length, Fold fold) const
     {
         Node* recent = m_recent.load(std::memory_order_relaxed);
-        if (recent != nullptr && !m_ambiguous && strcasecmp(recent->value.first.c_str(), text) == 0 &&
-            AsciiCaseFolding()) {
+        if (recent != nullptr && !m_ambiguous && AsciiCaseFolding() && NameIs(recent, text, length)) {
             return recent;
         }
         return Remember(FindNode(text, length, fold()));
+    }
+
+    // Only where the locale folds A-Z alone, as strcasecmp would then.
+    static bool NameIs(const Node* node, const char* text, size_type length)
+    {
+        const key_type& name = node->value.first;
+        return name.size() == length && AsciiFoldedEqual(name.c_str(), text, length);
     }
 
     Node* FindText(const char* text) const
@@ -554,7 +574,7 @@ private:
                 if (node == nullptr) {
                     return nullptr;
                 }
-                if (m_tags[i] == tag && node->foldHash == fold && strcasecmp(node->value.first.c_str(), text) == 0) {
+                if (m_tags[i] == tag && node->foldHash == fold && NameIs(node, text, length)) {
                     return node;
                 }
             }
