@@ -2,4 +2,16 @@
 // themselves from their own files.
 #include <benchmark/benchmark.h>
 
-BENCHMARK_MAIN();
+#include "common/bench_names.h"
+
+int main(int argc, char** argv)
+{
+    if (bench::RunProbe(argc, argv))
+        return 0;
+    benchmark::Initialize(&argc, argv);
+    if (benchmark::ReportUnrecognizedArguments(argc, argv))
+        return 1;
+    benchmark::RunSpecifiedBenchmarks();
+    benchmark::Shutdown();
+    return 0;
+}

@@ -69,7 +69,13 @@ void Flush(benchmark::State& state, Size size)
 
 [[maybe_unused]] const bool registered = [] {
     RegisterLoadLookup("gkeyfile", Load, Lookup);
+    RegisterLarge("gkeyfile", Load, Lookup);
     RegisterFlush("gkeyfile", Flush);
+    RegisterResident("gkeyfile", [](const std::string& path, auto measure) {
+        GKeyFile* file = LoadFile(path, G_KEY_FILE_NONE);
+        measure();
+        g_key_file_free(file);
+    });
     return true;
 }();
 

@@ -56,6 +56,11 @@ void Flush(benchmark::State& state, Size size)
 [[maybe_unused]] const bool registered = [] {
     RegisterLoadLookup("simpleini", Load, Lookup);
     RegisterFlush("simpleini", Flush);
+    RegisterResident("simpleini", [](const std::string& path, auto measure) {
+        CSimpleIniA ini;
+        ini.LoadFile(path.c_str());
+        measure();
+    });
     return true;
 }();
 

@@ -8,9 +8,8 @@ using namespace config_bench;
 
 namespace {
 
-void Load(benchmark::State& state, Size size)
+void LoadPath(benchmark::State& state, const std::string& path, int keys)
 {
-    const std::string path = DataFile(size);
     rvConfig config;
     for (auto _ : state) {
         if (config.Load(path.c_str(), rvConfig::OpenRead) == 0) {
@@ -18,7 +17,19 @@ void Load(benchmark::State& state, Size size)
             break;
         }
     }
-    CountEntries(state, size);
+    state.SetItemsProcessed(state.iterations() * keys);
+}
+
+void Load(benchmark::State& state, Size size)
+{
+    LoadPath(state, DataFile(size), size.Entries());
+}
+
+// Names that collide in the name hash against names of the usual layout,
+// 40,000 keys each.
+void LoadNames(benchmark::State& state, bool colliding)
+{
+    LoadPath(state, colliding ? CollidingFile() : DataFile(kOrdinaryNames), kOrdinaryNames.Entries());
 }
 
 void Lookup(benchmark::State& state, Size size)
@@ -84,7 +95,14 @@ void TypedGetters(benchmark::State& state)
 
 [[maybe_unused]] const bool registered = [] {
     RegisterLoadLookup("tessaline", Load, Lookup);
+    RegisterLarge("tessaline", Load, Lookup);
     RegisterFlush("tessaline", Flush);
+    bench::Register("config_names", "tessaline", "colliding40000", LoadNames, true)->Unit(benchmark::kMillisecond);
+    bench::Register("config_names", "tessaline", "ordinary40000", LoadNames, false)->Unit(benchmark::kMillisecond);
+    RegisterResident("tessaline", [](const std::string& path, auto measure) {
+        rvConfig config(path.c_str(), rvConfig::OpenRead);
+        measure();
+    });
     bench::Register("config_typed_get", "tessaline", "300", TypedGetters)->Unit(benchmark::kMicrosecond);
     return true;
 }();

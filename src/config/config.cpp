@@ -3,7 +3,6 @@
 #include <cstring>
 #include <utility>
 
-#include "config/borrowed_name.h"
 #include "config/class_lock.h"
 #include "config/config_name.h"
 #include "config/lookup.h"
@@ -11,8 +10,8 @@
 #include "tessaline/config/rvConfig.h"
 #include "util/load_time.h"
 
-using tessaline::config::BorrowedName;
 using tessaline::config::kMaxConfigName;
+using tessaline::config::NameText;
 using tessaline::config::ScopedClassLock;
 
 const char* rvConfig::m_szCommentChars = "#;/";
@@ -85,14 +84,16 @@ rvConfig::operator const char*()
 
 unsigned int rvConfig::Section(const char* name, unsigned int create)
 {
-    cfgStr section(name);
-    if (m_sections.find(section) == m_sections.end()) {
-        if (create == 0) {
-            return 0;
-        }
-        m_sections.insert(SectionTable::value_type(section, KeyTable()));
-        ++m_nItems;
+    if (NameText(name).In(m_sections) != m_sections.end()) {
+        m_strSection = cfgStr(name);
+        return 1;
     }
+    if (create == 0) {
+        return 0;
+    }
+    cfgStr section(name);
+    m_sections.insert(SectionTable::value_type(section, KeyTable()));
+    ++m_nItems;
     m_strSection = std::move(section);
     return 1;
 }
@@ -127,18 +128,18 @@ unsigned int rvConfig::IsValid()
     return m_nItems;
 }
 
-unsigned int tessaline::config::FindValue(rvConfig& config, const rvConfig::cfgStr& key, rvConfig::cfgStr* value,
-                                          const rvConfig::cfgStr& section)
+unsigned int tessaline::config::FindValue(rvConfig& config, const NameText& key, rvConfig::cfgStr* value,
+                                          const NameText& section)
 {
     ScopedClassLock lock;
-    const rvConfig::cfgStr& name = section.empty() ? config.m_strSection : section;
-    const rvConfig::SectionTable::iterator found = config.m_sections.find(name);
+    // Callers look many keys up in one section in a row.
+    const NameText& name = section.empty() ? NameText(config.m_strSection) : section;
+    const rvConfig::SectionTable::iterator found = name.InRecent(config.m_sections);
     if (found == config.m_sections.end()) {
         return 0;
     }
-    const rvConfig::KeyTable& keys = found->second;
-    const rvConfig::KeyTable::const_iterator entry = keys.find(key);
-    if (entry == keys.end()) {
+    const rvConfig::KeyTable::iterator entry = key.In(found->second);
+    if (entry == found->second.end()) {
         return 0;
     }
     *value = entry->second;
@@ -149,7 +150,7 @@ unsigned int tessaline::config::FindValue(rvConfig& config, const rvConfig::cfgS
 // NOLINTNEXTLINE(performance-unnecessary-value-param)
 unsigned int rvConfig::_GetValue(cfgStr key, cfgStr* value, cfgStr section)
 {
-    return tessaline::config::FindValue(*this, key, value, section);
+    return tessaline::config::FindValue(*this, NameText(key), value, NameText(section));
 }
 
 // NOLINTNEXTLINE(performance-unnecessary-value-param)
@@ -171,7 +172,7 @@ unsigned int rvConfig::_PutValue(cfgStr key, cfgStr value, cfgStr section)
 const char* rvConfig::GetValue(const char* key, const char* def, const char* section)
 {
     cfgStr value;
-    if (tessaline::config::FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) == 0) {
+    if (tessaline::config::FindValue(*this, NameText(key), &value, NameText(section)) == 0) {
         return def;
     }
     m_strValue = std::move(value);

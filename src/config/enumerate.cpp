@@ -1,9 +1,8 @@
 // Enumeration, counts and removal.
-#include "config/borrowed_name.h"
 #include "config/class_lock.h"
+#include "config/lookup.h"
 #include "tessaline/config/rvConfig.h"
 
-using tessaline::config::BorrowedName;
 using tessaline::config::ScopedClassLock;
 
 const char* rvConfig::EnumSections(unsigned int first)
@@ -24,7 +23,7 @@ const char* rvConfig::EnumTokens(const char* section, unsigned int first)
     if (first != 0) {
         m_bTokenStart = 1;
     }
-    const SectionTable::iterator found = m_sections.find(BorrowedName(section));
+    const SectionTable::iterator found = m_sections.find(section);
     if (found == m_sections.end()) {
         return nullptr;
     }
@@ -44,7 +43,7 @@ const char* rvConfig::EnumTokens(const char* section, unsigned int first)
 
 unsigned int rvConfig::TokenCnt(const char* section)
 {
-    const SectionTable::const_iterator found = m_sections.find(BorrowedName(section));
+    const SectionTable::iterator found = tessaline::config::NameText(section).In(m_sections);
     return found == m_sections.end() ? 0 : static_cast<unsigned int>(found->second.size());
 }
 
@@ -56,9 +55,9 @@ unsigned int rvConfig::SectionCnt()
 void rvConfig::RemoveKey(const char* section, const char* key)
 {
     ScopedClassLock lock;
-    const SectionTable::iterator found = m_sections.find(BorrowedName(section));
+    const SectionTable::iterator found = m_sections.find(section);
     if (found != m_sections.end()) {
-        found->second.erase(BorrowedName(key));
+        found->second.erase(key);
     }
     IsModified(1);
 }
@@ -66,6 +65,6 @@ void rvConfig::RemoveKey(const char* section, const char* key)
 void rvConfig::RemoveSection(const char* section)
 {
     ScopedClassLock lock;
-    m_sections.erase(BorrowedName(section));
+    m_sections.erase(section);
     IsModified(1);
 }

@@ -186,11 +186,7 @@ void ReadPass(rvConfig& config)
         if (keys == nullptr) {
             keys = &SectionKeys(config, running);
         }
-        const std::pair<rvConfig::KeyTable::iterator, bool> added =
-            keys->insert(rvConfig::KeyTable::value_type(keyNames.Get(key), rvConfig::cfgStr()));
-        if (added.second) {
-            added.first->second = rvConfig::cfgStr(value);
-        }
+        keys->try_emplace(keyNames.Get(key), value);
         ++config.m_nItems;
     }
     config.Close(0);
@@ -270,9 +266,17 @@ char* rvConfig::Clean(char* text)
     while (IsTrimmed(*start)) {
         ++start;
     }
-    char* end = start + std::strlen(start);
-    while (end > start && IsTrimmed(end[-1])) {
-        *--end = '\0';
+    // One pass to the end, remembering where the kept text stops: lines are
+    // short, and a call to strlen would cost more than the loop.
+    char* kept = start;
+    char* end = start;
+    for (; *end != '\0'; ++end) {
+        if (!IsTrimmed(*end)) {
+            kept = end + 1;
+        }
+    }
+    if (kept != start) {
+        std::memset(kept, '\0', static_cast<std::size_t>(end - kept));
     }
     return start;
 }

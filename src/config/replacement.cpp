@@ -153,7 +153,8 @@ unsigned int Replacement::Commit()
     const char* configName = m_configName.c_str();
     const char* tempName = m_tempName.c_str();
     const std::string& backupName = m_backupName;
-    sys::SyncDirectory(tempName);
+    // The side files share the file's directory, so one sync after the
+    // renames makes the new name and the backup durable together.
     const bool oldFileExists = Sys().access(configName, F_OK) == 0;
     const unsigned int result = oldFileExists && ReplaceInOneStep(configName, tempName, backupName)
                                     ? 1

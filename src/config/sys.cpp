@@ -22,9 +22,10 @@ int StatPath(const char* path, struct stat* info)
     return ::stat(path, info);
 }
 
+// The library's own streams have one user at a time: the unlocked forms.
 SysCalls g_sys = {
-    ::fopen, ::fdopen, ::fgets,  ::ferror, ::fwrite_unlocked, ::fflush,   ::fclose, OpenFile, ::close,
-    ::fsync, ::fchmod, ::fchown, StatPath, ::access,          ::readlink, ::rename, ::link,   ::unlink,
+    ::fopen, ::fdopen, ::fgets_unlocked, ::ferror_unlocked, ::fwrite_unlocked, ::fflush,   ::fclose, OpenFile, ::close,
+    ::fsync, ::fchmod, ::fchown,         StatPath,          ::access,          ::readlink, ::rename, ::link,   ::unlink,
 };
 
 }  // namespace

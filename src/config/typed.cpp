@@ -4,13 +4,12 @@
 #include <climits>
 #include <cstdio>
 #include <cstdlib>
-#include "config/borrowed_name.h"
 #include "config/lookup.h"
 #include "tessaline/config/rvConfig.h"
 #include "tessaline/util/rvString.h"
 
-using tessaline::config::BorrowedName;
 using tessaline::config::FindValue;
+using tessaline::config::NameText;
 
 namespace tessaline::config {
 namespace {
@@ -26,7 +25,7 @@ using tessaline::config::kNumberBufferSize;
 int rvConfig::GetValue(const char* key, int def, const char* section)
 {
     cfgStr value;
-    if (FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) == 0) {
+    if (FindValue(*this, NameText(key), &value, NameText(section)) == 0) {
         return def;
     }
     // Where long is 64 bits wide, clamp to what a 32-bit strtol gives.
@@ -43,7 +42,7 @@ int rvConfig::GetValue(const char* key, int def, const char* section)
 double rvConfig::GetValue(const char* key, double def, const char* section)
 {
     cfgStr value;
-    if (FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) == 0) {
+    if (FindValue(*this, NameText(key), &value, NameText(section)) == 0) {
         return def;
     }
     return std::strtod(value.c_str(), nullptr);
@@ -53,7 +52,7 @@ void rvConfig::GetValue(__gnu_cxx::crope& out, const __gnu_cxx::crope& key, cons
                         const __gnu_cxx::crope& section)
 {
     cfgStr value;
-    if (FindValue(*this, cfgStr(key), &value, cfgStr(section)) != 0) {
+    if (FindValue(*this, NameText(cfgStr(key)), &value, NameText(cfgStr(section))) != 0) {
         out = value;
     } else {
         out = def;
@@ -63,7 +62,7 @@ void rvConfig::GetValue(__gnu_cxx::crope& out, const __gnu_cxx::crope& key, cons
 void rvConfig::GetValue(__gnu_cxx::crope& out, const char* key, const char* def, const char* section)
 {
     cfgStr value;
-    if (FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) != 0) {
+    if (FindValue(*this, NameText(key), &value, NameText(section)) != 0) {
         out = value;
     } else {
         out = cfgStr(def);
@@ -73,7 +72,7 @@ void rvConfig::GetValue(__gnu_cxx::crope& out, const char* key, const char* def,
 unsigned int rvConfig::GetBool(const char* key, unsigned int def, const char* section)
 {
     cfgStr value;
-    if (FindValue(*this, BorrowedName(key), &value, BorrowedName(section)) == 0) {
+    if (FindValue(*this, NameText(key), &value, NameText(section)) == 0) {
         return def;
     }
     const char* text = value.c_str();

@@ -3,13 +3,14 @@
 #include <cstdio>
 #include <cstring>
 #include <ctime>
+#include <memory>
 #include <string>
 
 #include <unistd.h>
 
-#include "config/borrowed_name.h"
 #include "config/class_lock.h"
 #include "config/config_name.h"
+#include "config/lookup.h"
 #include "config/passes.h"
 #include "config/replacement.h"
 #include "config/sys.h"
@@ -23,30 +24,78 @@ namespace {
 
 constexpr std::size_t kTimeBufferSize = 128;
 
-// The merged text on its way into the temporary file.
+// The merged text on its way into the temporary file, gathered in a buffer
+// and written in large pieces.
 class Output {
 public:
     explicit Output(Replacement& file) : m_file(file) {}
 
-    void Put(const char* text) { m_file.Write(text, std::strlen(text)); }
+    void Put(const char* text) { Put(text, std::strlen(text)); }
 
-    // One write per key line, through a buffer that keeps its capacity.
+    void Put(const char* text, std::size_t length)
+    {
+        if (m_used + length > kBufferSize) {
+            Drain();
+            if (length > kBufferSize) {
+                m_file.Write(text, length);
+                return;
+            }
+        }
+        std::memcpy(m_buffer.get() + m_used, text, length);
+        m_used += length;
+    }
+
     void PutKey(const char* key, const char* value)
     {
-        m_line.assign(key).append(" = ").append(value).append("\n");
-        m_file.Write(m_line.data(), m_line.size());
+        const std::size_t keyLength = std::strlen(key);
+        const std::size_t valueLength = std::strlen(value);
+        if (m_used + keyLength + valueLength + 4 > kBufferSize) {
+            Put(key, keyLength);
+            Put(" = ", 3);
+            Put(value, valueLength);
+            Put("\n", 1);
+            return;
+        }
+        char* line = m_buffer.get() + m_used;
+        std::memcpy(line, key, keyLength);
+        std::memcpy(line + keyLength, " = ", 3);
+        std::memcpy(line + keyLength + 3, value, valueLength);
+        line[keyLength + valueLength + 3] = '\n';
+        m_used += keyLength + valueLength + 4;
+    }
+
+    // Hands what is gathered to the file.
+    void Drain()
+    {
+        if (m_used != 0) {
+            m_file.Write(m_buffer.get(), m_used);
+            m_used = 0;
+        }
     }
 
 private:
+    static constexpr std::size_t kBufferSize = 65536;
+
     Replacement& m_file;
-    std::string m_line;
+    std::unique_ptr<char[]> m_buffer{new char[kBufferSize]};
+    std::size_t m_used = 0;
 };
 
 // Restores the section table when the writing pass is over, however it
-// ends: the pass consumes the table it works on.
+// ends: the pass consumes the table it works on. It works on a copy that
+// borrows the entries of the saved table, so that neither the copy nor the
+// consumption touches a text; the table given back is the one taken.
 class TableRestorer {
 public:
-    explicit TableRestorer(rvConfig::SectionTable& table) : m_table(table), m_saved(table) {}
+    explicit TableRestorer(rvConfig::SectionTable& table) : m_table(table), m_saved(std::move(table))
+    {
+        try {
+            m_table = rvConfig::SectionTable(m_saved, BorrowingCopy());
+        } catch (...) {
+            m_table.swap(m_saved);
+            throw;
+        }
+    }
     ~TableRestorer() { m_table.swap(m_saved); }
     TableRestorer(const TableRestorer&) = delete;
     TableRestorer& operator=(const TableRestorer&) = delete;
@@ -102,13 +151,18 @@ void MergeKeyLine(rvConfig& config, Output& out, char* text, const rvConfig::cfg
     }
     out.PutKey(key, value);
     // Erase from the section the lookup searched: "" is the current one.
+    // The lookup has just found both names, so neither is hashed again.
     const rvConfig::cfgStr& name = running.empty() ? config.m_strSection : running;
-    const rvConfig::SectionTable::iterator section = config.m_sections.find(name);
+    const rvConfig::SectionTable::iterator section = NameText(name).InRecent(config.m_sections);
     if (section == config.m_sections.end()) {
         return;
     }
-    section->second.erase(BorrowedName(key));
-    if (section->second.empty()) {
+    rvConfig::KeyTable& keys = section->second;
+    const rvConfig::KeyTable::iterator entry = NameText(key).InRecent(keys);
+    if (entry != keys.end()) {
+        keys.erase(entry);
+    }
+    if (keys.empty()) {
         // A copy: removing the current section may replace m_strSection.
         const rvConfig::cfgStr emptied = name;
         config.RemoveSection(emptied.c_str());
@@ -203,6 +257,7 @@ unsigned int WritePass(rvConfig& config)
     Drain(config, out, running);
     WriteNewSections(config, out);
     WriteIdentificationLine(out);
+    out.Drain();
     return file.Commit();
 }
 

@@ -6,6 +6,7 @@
 
 #include <gtest/gtest.h>
 
+#include "config/temp_dir.h"
 #include "tessaline/config/rvConfig.h"
 
 namespace {
@@ -188,6 +189,61 @@ TEST(RvConfigOrder, GrowthAtThe194thEntryReversesChains)
     keys.PutValue("port", "3", "s");  // a replacement in a full table grows it too
     EXPECT_TRUE(comesBefore(keysInOrder(keys, "s"), "port", "timeout"));
     EXPECT_EQ(keys.TokenCnt("s"), 193u);
+}
+
+// Names that agree in every byte the name hash reads (1, 3, 8, 14 and 18
+// from the end) all share one chain, as a hostile file would have them.
+TEST(RvConfigOrder, NamesThatShareOneChain)
+{
+    const auto name = [](int n, char base) {
+        std::string digits = std::to_string(n);
+        digits.insert(0, 15 - digits.size(), '0');
+        std::string text(20, base == 'a' ? 'x' : 'X');
+        for (int i = 0, d = 0; i < 20; ++i) {
+            if (i != 2 && i != 6 && i != 12 && i != 17 && i != 19) {
+                text[i] = static_cast<char>(base + (digits[d++] - '0'));
+            }
+        }
+        return text;
+    };
+    constexpr int kNames = 2000;
+    std::string file = "[s]\n";
+    for (int n = 0; n < kNames; ++n) {
+        file += name(n, 'a') + " = v" + std::to_string(n) + "\n";
+    }
+    file += name(7, 'A') + " = second\n";
+    const tessaline::test::ConfigDir dir;
+    rvConfig config(dir.Write("collide.ini", file).c_str(), rvConfig::OpenRead);
+
+    // Newest first in the chain, which each growth (193, 389, 769, 1543)
+    // reverses.
+    Names expected;
+    for (int n = 0; n < kNames; ++n) {
+        if (n == 193 || n == 389 || n == 769 || n == 1543) {
+            std::reverse(expected.begin(), expected.end());
+        }
+        expected.insert(expected.begin(), name(n, 'a'));
+    }
+    EXPECT_EQ(keysInOrder(config, "s"), expected);
+    EXPECT_EQ(config.m_sections.find("s")->second.bucket_count(), 3079u);
+
+    int wrong = 0;
+    for (int n = 0; n < kNames; ++n) {
+        const char* value = config.GetValue(name(n, 'A').c_str(), static_cast<const char*>(nullptr), "S");
+        wrong += value == nullptr || value != "v" + std::to_string(n);
+    }
+    EXPECT_EQ(wrong, 0);
+    EXPECT_EQ(config.GetValue(name(kNames, 'a').c_str(), static_cast<const char*>(nullptr), "s"), nullptr);
+
+    for (int n = 0; n < kNames; n += 2) {
+        config.RemoveKey("s", name(n, 'a').c_str());
+    }
+    for (int n = 0; n < kNames; ++n) {
+        const bool found = config.GetValue(name(n, 'A').c_str(), static_cast<const char*>(nullptr), "s") != nullptr;
+        wrong += found != (n % 2 == 1);
+    }
+    EXPECT_EQ(wrong, 0);
+    EXPECT_EQ(config.TokenCnt("s"), unsigned(kNames / 2));
 }
 
 }  // namespace

@@ -43,24 +43,16 @@
 #ifndef TESSALINE_CONFIG_RVCONFIG_H
 #define TESSALINE_CONFIG_RVCONFIG_H
 
+#include <atomic>
 #include <cstddef>
+#include <cstdint>
 #include <cstdio>
 #include <cstring>
 #include <strings.h>
 
-// The extension hash containers announce themselves as deprecated unless
-// this macro is set; hosts build with warnings as errors, so permit them here
-// without changing the macro for the host's own includes.
-#ifndef _GLIBCXX_PERMIT_BACKWARD_HASH
-#define _GLIBCXX_PERMIT_BACKWARD_HASH
-#define TESSALINE_RVCONFIG_PERMITTED_BACKWARD_HASH
-#endif
-#include <ext/hash_map>
-#ifdef TESSALINE_RVCONFIG_PERMITTED_BACKWARD_HASH
-#undef _GLIBCXX_PERMIT_BACKWARD_HASH
-#undef TESSALINE_RVCONFIG_PERMITTED_BACKWARD_HASH
-#endif
 #include <ext/rope>
+
+#include "tessaline/config/NameTable.h"
 
 #include "tessaline/thread/MThread.h"
 #include "tessaline/export.h"
@@ -77,54 +69,143 @@ public:
     /// One shared reference to immutable text. Copies share the text; an
     /// empty string is held as a null reference, which is what "empty" means
     /// for a section argument. Built from a `const char*`, it copies the
-    /// characters; a null pointer is taken as "".
+    /// characters; a null pointer is taken as "". Built from a rope, it
+    /// shares the rope's text, and turns back into a rope that shares it too;
+    /// it is not itself a rope, so its copies never take the rope's lock.
     ///
-    /// The key and value type of the tables. The reference count is
-    /// thread-safe, so copies of one text may live in different threads; a
-    /// single cfgStr object is not to be written by two threads at once.
-    class cfgStr : public __gnu_cxx::crope {
+    /// The key and value type of the tables. The reference count is atomic,
+    /// so copies of one text may live in different threads; a single cfgStr
+    /// object is not to be written by two threads at once.
+    class cfgStr {
     public:
         /// The empty text, held as a null reference.
-        cfgStr() {}
+        cfgStr() noexcept = default;
         /// Copies the characters up to the NUL; null gives "".
-        cfgStr(const char* text) : __gnu_cxx::crope(text != nullptr ? text : "") {}
-        /// Copies `length` characters of `text`, NULs included; `text` must
-        /// hold that many.
-        cfgStr(const char* text, std::size_t length) : __gnu_cxx::crope(text, length) {}
+        cfgStr(const char* text);
+        /// Copies `length` characters of `text`, which must hold that many;
+        /// the text reads up to the first NUL among them.
+        cfgStr(const char* text, std::size_t length);
         /// Shares the rope's text; copies no characters.
-        cfgStr(const __gnu_cxx::crope& text) : __gnu_cxx::crope(text) {}
+        cfgStr(const __gnu_cxx::crope& text);
         /// Shares `other`'s text.
-        cfgStr(const cfgStr& other) : __gnu_cxx::crope(other) {}
-        /// Takes `other`'s text and leaves `other` empty.
-        cfgStr(cfgStr&& other) noexcept { swap(other); }
-        /// Shares `other`'s text and drops the old one.
-        cfgStr& operator=(const cfgStr& other)  // NOLINT(cert-oop54-cpp): the rope's assignment is self-safe
+        cfgStr(const cfgStr& other) noexcept : m_bits(other.m_bits & ~kBorrowed) { Hold(); }
+        /// Shares `source`'s text without counting it: valid only while the
+        /// text is held elsewhere. Tables make such references for Flush's
+        /// working copy; any copy or move of one counts as usual.
+        cfgStr(const cfgStr& source, tessaline::config::BorrowingCopy) noexcept
+            : m_bits(source.m_bits == 0 ? 0 : source.m_bits | kBorrowed)
         {
-            __gnu_cxx::crope::operator=(other);
+        }
+        /// Takes `other`'s text and leaves `other` empty.
+        cfgStr(cfgStr&& other) noexcept : m_bits(other.m_bits)
+        {
+            other.m_bits = 0;
+            if ((m_bits & kBorrowed) != 0) {
+                m_bits &= ~kBorrowed;
+                Hold();
+            }
+        }
+        ~cfgStr()
+        {
+            if (m_bits != 0 && (m_bits & kBorrowed) == 0) {
+                Drop(Get());
+            }
+        }
+        /// Shares `other`'s text and drops the old one.
+        cfgStr& operator=(const cfgStr& other) noexcept
+        {
+            cfgStr copy(other);
+            copy.SwapBits(*this);
             return *this;
         }
-        /// Exchanges the texts: `other` receives the old one.
+        /// Takes `other`'s text, leaves `other` empty and drops the old one.
         cfgStr& operator=(cfgStr&& other) noexcept
         {
-            swap(other);
+            cfgStr taken(std::move(other));
+            taken.SwapBits(*this);
             return *this;
+        }
+        /// Exchanges the texts.
+        void swap(cfgStr& other) noexcept
+        {
+            cfgStr mine(std::move(*this));
+            *this = std::move(other);
+            other = std::move(mine);
         }
 
         /// The text, NUL-terminated; "" when empty, never null. Valid while
-        /// any cfgStr shares this text. Text made of one piece, as all text
-        /// built from a `const char*` is, is handed out without taking the
-        /// rope's own lock, which keeps the table's comparisons cheap.
-        const char* c_str() const
+        /// any cfgStr shares this text.
+        const char* c_str() const noexcept
         {
-            const _RopeRep* rep = this->_M_tree_ptr;
-            if (rep == nullptr) {
+            const Text* text = Get();
+            if (text == nullptr) {
                 return "";
             }
-            if (rep->_M_tag == __gnu_cxx::__detail::_S_leaf) {
-                return static_cast<const _RopeLeaf*>(rep)->_M_data;
+            if ((text->length & kRopeText) != 0) {
+                return RopeChars(text);
             }
-            return __gnu_cxx::crope::c_str();
+            return reinterpret_cast<const char*>(text + 1);
         }
+        /// The length of c_str().
+        std::size_t size() const noexcept { return m_bits == 0 ? 0 : Get()->length & ~kRopeText; }
+        std::size_t length() const noexcept { return size(); }
+        bool empty() const noexcept { return m_bits == 0; }
+
+        /// The text as a rope: shared when it came from a rope, else copied.
+        operator __gnu_cxx::crope() const;
+
+        /// tessaline::config::FoldedNameHash of the text, kept with the text
+        /// after its first use.
+        unsigned int FoldHash() const noexcept
+        {
+            Text* text = Get();
+            if (text == nullptr) {
+                return tessaline::config::FoldedNameHash("", 0);
+            }
+            const unsigned int fold = text->foldHash.load(std::memory_order_relaxed);
+            return fold != 0 ? fold : StoreFoldHash(text);
+        }
+
+    private:
+        // The shared block: this header, then the characters, or for text
+        // shared with a rope a header of the library's own.
+        struct Text {
+            std::atomic<unsigned int> refs;
+            unsigned int length;
+            std::atomic<unsigned int> foldHash;
+        };
+        static constexpr unsigned int kRopeText = 0x80000000u;
+        struct RopeText;
+
+        // The low bit of m_bits marks a reference that does not count.
+        static constexpr std::uintptr_t kBorrowed = 1;
+
+        Text* Get() const noexcept { return reinterpret_cast<Text*>(m_bits & ~kBorrowed); }
+        void Hold() const noexcept
+        {
+            if (m_bits != 0) {
+                Get()->refs.fetch_add(1, std::memory_order_relaxed);
+            }
+        }
+        void SwapBits(cfgStr& other) noexcept
+        {
+            const std::uintptr_t bits = m_bits;
+            m_bits = other.m_bits;
+            other.m_bits = bits;
+        }
+        void Adopt(Text* text) noexcept { m_bits = reinterpret_cast<std::uintptr_t>(text); }
+
+        static void Drop(Text* text) noexcept
+        {
+            if (text->refs.fetch_sub(1, std::memory_order_acq_rel) == 1) {
+                Free(text);
+            }
+        }
+        static void Free(Text* text) noexcept;
+        static const char* RopeChars(const Text* text) noexcept;
+        static unsigned int StoreFoldHash(Text* text) noexcept;
+
+        std::uintptr_t m_bits = 0;
     };
 
     /// The name hash of both table levels.
@@ -136,14 +217,14 @@ public:
         /// the table reduces it modulo its bucket count unchanged. An empty
         /// name hashes to 0; at most five bytes are read, whatever the
         /// length.
-        unsigned int operator()(const cfgStr& name) const
+        unsigned int operator()(const cfgStr& name) const { return (*this)(name.c_str(), name.size()); }
+        /// The same for the `length` characters at `text`.
+        unsigned int operator()(const char* text, std::size_t length) const
         {
-            const char* text = name.c_str();
-            const long length = static_cast<long>(std::strlen(text));
-            static const int kPositions[] = {1, 3, 8, 14, 18};
+            constexpr std::size_t kPositions[] = {1, 3, 8, 14, 18};
             int h = 0;
-            for (int k : kPositions) {
-                if (length - k < 0) {
+            for (std::size_t k : kPositions) {
+                if (length < k) {
                     break;
                 }
                 unsigned char byte = static_cast<unsigned char>(text[length - k]);
@@ -166,12 +247,15 @@ public:
     /// Both levels start with 193 buckets. Their order of iteration (buckets
     /// upward, newest entry first within a bucket, chains reversed by a
     /// rehash) is the order of enumeration and of new lines in a saved file.
+    /// They offer the extension hash_map's members (find, insert, erase,
+    /// operator[], iteration, size, bucket_count, ...) and find a name in
+    /// constant time, however many names share a bucket.
     ///@{
 
     /// The keys of one section: key name to value.
-    typedef __gnu_cxx::hash_map<const cfgStr, cfgStr, rvstrhashfunction, eqcstr> KeyTable;
+    typedef tessaline::config::NameTable<const cfgStr, cfgStr, rvstrhashfunction, eqcstr> KeyTable;
     /// The sections: section name to its KeyTable.
-    typedef __gnu_cxx::hash_map<const cfgStr, KeyTable, rvstrhashfunction, eqcstr> SectionTable;
+    typedef tessaline::config::NameTable<const cfgStr, KeyTable, rvstrhashfunction, eqcstr> SectionTable;
     ///@}
 
     /// @name Format of the file
@@ -545,7 +629,7 @@ public:
     /// Cursor of EnumSections.
     SectionTable::iterator m_itSection;
     /// Cursor of EnumTokens.
-    KeyTable::iterator m_itToken{nullptr, nullptr};
+    KeyTable::iterator m_itToken;
     ///@}
     /// The configuration file's name, NUL-terminated, at most 4094
     /// characters; a longer name is kept cut, and never written by Flush.
