@@ -3,7 +3,7 @@
  * Twofish engine, the text encryption entry points and the handle calls.
  * Built as C11 with -pedantic, it shows that the headers are C and that the
  * types and structures mean the same on both sides; what each call does is
- * tested in the C++ suites. Exits non-zero when a result is wrong.
+ * tested in the C++ suites. Names each wrong result and exits non-zero.
  */
 #define _XOPEN_SOURCE 700
 
@@ -25,18 +25,14 @@ static int failures = 0;
 
 static void check(int ok, const char* what)
 {
-    if (!ok) {
+    if (!ok)
         fprintf(stderr, "FAILED: %s\n", what);
-        ++failures;
-    }
+    failures += !ok;
 }
 
 static void textHelpers(void)
 {
-    char mixed[] = "MiXeD";
-    char haystack[] = "Find the NEEDLE here";
-    char copy[8] = "zzzzzzz";
-    char number[80];
+    char mixed[] = "MiXeD", haystack[] = "Find the NEEDLE here", copy[8] = "zzzzzzz", number[80];
 
     check(_stricmp("Hello", "HELLO") == 0 && _strnicmp("HelloX", "helloY", 5) == 0, "compare");
     check(strcmp(_strupr(_strlwr(mixed)), "MIXED") == 0 && rv_lowerTable['Q'] == 'q', "case");
@@ -54,43 +50,38 @@ static void textHelpers(void)
 
 static void pathServices(const char* root)
 {
-    char deep[PATH_MAX];
-    char resolved[PATH_MAX];
-    char expected[PATH_MAX];
+    char deep[PATH_MAX], resolved[PATH_MAX], expected[PATH_MAX];
 
-    snprintf(deep, sizeof deep, "%s/a/b/c", root);
+    snprintf(deep, sizeof deep, "%s/a/b", root);
     check(CreateDir(deep, 0) == 1 && FileExists(deep) == 1, "CreateDir makes the parents");
-    snprintf(deep, sizeof deep, "%s/a/b/c/..", root);
+    snprintf(deep, sizeof deep, "%s/a/b/..", root);
     check(realpath(deep, expected) != NULL, "realpath of the test tree");
     check(strcmp(GetFullDirectoryName(deep, resolved, sizeof resolved), expected) == 0,
           "GetFullDirectoryName resolves");
     check(DiskFreeSpace(root) > 0, "DiskFreeSpace of the test tree");
+    snprintf(deep, sizeof deep, "%s/a/b", root);
+    check(rmdir(deep) == 0 && rmdir(expected) == 0, "the test tree goes");
 }
 
 static void encryption(void)
 {
-    static const unsigned char kZeroKeyZeroBlock[16] = {0xA2, 0xFB, 0x66, 0x0C, 0x9A, 0x92, 0xBA, 0xF3,
-                                                        0x45, 0x29, 0xFD, 0x18, 0xD9, 0x9B, 0x81, 0xAE};
-    keyInstance key;
+    /* A zero block under the all-zero 128-bit key, in the engine's byte order. */
+    static const unsigned char kSealed[16] = {0xA2, 0xFB, 0x66, 0x0C, 0x9A, 0x92, 0xBA, 0xF3,
+                                              0x45, 0x29, 0xFD, 0x18, 0xD9, 0x9B, 0x81, 0xAE};
+    keyInstance key = {0};
     cipherInstance cipher;
-    unsigned char block[BLOCK_SIZE / 8] = {0};
-    unsigned char data[] = "from C";
+    unsigned char zero[BLOCK_SIZE / 8] = {0}, block[BLOCK_SIZE / 8] = {0}, out[16], data[] = "from C";
     char text[64];
-    unsigned char out[16];
     unsigned long length = sizeof out;
     unsigned int wasPlain = 1;
 
-    memset(&key, 0, sizeof key);
     check(makeKey(&key, DIR_ENCRYPT, 128, NULL) == TRUE && reKey(&key) == TRUE &&
               cipherInit(&cipher, MODE_ECB, NULL) == TRUE,
           "keying");
-    check(blockEncrypt(&cipher, &key, block, BLOCK_SIZE, block) == BLOCK_SIZE &&
-              memcmp(block, kZeroKeyZeroBlock, sizeof block) == 0,
+    check(blockEncrypt(&cipher, &key, block, BLOCK_SIZE, block) == BLOCK_SIZE && memcmp(block, kSealed, 16) == 0,
           "blockEncrypt");
-    check(blockDecrypt(&cipher, &key, block, BLOCK_SIZE, block) == BLOCK_SIZE && block[0] == 0 &&
-              memcmp(block, block + 1, sizeof block - 1) == 0,
+    check(blockDecrypt(&cipher, &key, block, BLOCK_SIZE, block) == BLOCK_SIZE && memcmp(block, zero, 16) == 0,
           "blockDecrypt");
-
     check(RVUI_Encrypt(data, 6, text) == 1 && strlen(text) == 36, "RVUI_Encrypt");
     check(RVUI_Decrypt(text, out, &length, &wasPlain) == 1 && length == 6 && wasPlain == 0 && memcmp(out, data, 6) == 0,
           "RVUI_Decrypt");
@@ -98,18 +89,13 @@ static void encryption(void)
 
 static void handleCalls(const char* root)
 {
-    char path[PATH_MAX];
-    char buffer[8] = {0};
-    unsigned long done = 0;
-    unsigned long high = 1;
+    char path[PATH_MAX], buffer[8] = {0};
+    unsigned long done = 0, high = 1;
     void* handle;
 
     snprintf(path, sizeof path, "%s/data.bin", root);
     handle = CreateFile(path, O_RDWR | O_CREAT, 0, NULL, O_TRUNC, 0644, NULL);
-    if (handle == (void*)-1) {
-        check(0, "CreateFile creates");
-        return;
-    }
+    check(handle != (void*)-1, "CreateFile creates");
     check(WriteFile(handle, "0123456789", 10, &done, NULL) == 1 && done == 10, "WriteFile");
     check(GetFileSize64(handle) == 10 && GetFileSize(handle, &high) == 10 && high == 0, "file size");
     check(SetFilePointer64(handle, 2, SEEK_SET) == 2, "SetFilePointer64");
@@ -122,9 +108,6 @@ int main(void)
 {
     const char* tmp = getenv("TMPDIR");
     char root[256];
-    char name[PATH_MAX];
-    const char* tree[] = {"a/b/c", "a/b", "a"};
-    size_t i;
 
     snprintf(root, sizeof root, "%s/tessaline-c-host-XXXXXX", tmp != NULL && *tmp ? tmp : "/tmp");
     if (mkdtemp(root) == NULL) {
@@ -135,15 +118,6 @@ int main(void)
     pathServices(root);
     encryption();
     handleCalls(root);
-    for (i = 0; i < sizeof tree / sizeof tree[0]; ++i) {
-        snprintf(name, sizeof name, "%s/%s", root, tree[i]);
-        rmdir(name);
-    }
     rmdir(root);
-    if (failures != 0) {
-        fprintf(stderr, "%d check(s) failed\n", failures);
-        return 1;
-    }
-    puts("C host: all checks passed");
-    return 0;
+    return failures == 0 ? 0 : 1;
 }

@@ -14,10 +14,9 @@
 TEST(FirstUse, ManyThreadsKeyAtOnce)
 {
     ASSERT_EQ(1, __atomic_load_n(&needToBuildMDS, __ATOMIC_ACQUIRE)) << "table already built";
-    const std::string zeroKeyBlock = "\xA2\xFB\x66\x0C\x9A\x92\xBA\xF3\x45\x29\xFD\x18\xD9\x9B\x81\xAE";
-    const std::string hello = "Hello World!";
-    const std::string helloText = "D9F35E45F0B32BB01E0F8FA0FC5041E80CAB";
-    const std::string expected[3] = {zeroKeyBlock, helloText, hello};
+    // What each of the three kinds of thread below must come to.
+    const std::string expected[3] = {"\xA2\xFB\x66\x0C\x9A\x92\xBA\xF3\x45\x29\xFD\x18\xD9\x9B\x81\xAE",
+                                     "D9F35E45F0B32BB01E0F8FA0FC5041E80CAB", "Hello World!"};
 
     constexpr int kThreads = 9;
     std::atomic<int> waiting{kThreads};
@@ -39,12 +38,12 @@ TEST(FirstUse, ManyThreadsKeyAtOnce)
                 blockEncrypt(&cipher, &key, block, 128, block);
                 results[t].assign(reinterpret_cast<char*>(block), 16);
             } else if (t % 3 == 1) {
-                std::string value = hello;
+                std::string value = expected[2];
                 char text[64];
                 rvEncrypt(reinterpret_cast<unsigned char*>(&value[0]), value.size(), text);
                 results[t] = text;
             } else {
-                std::string text = helloText;
+                std::string text = expected[1];
                 unsigned char value[32];
                 unsigned long length = sizeof value;
                 rvDecrypt(&text[0], value, &length, nullptr);
