@@ -54,16 +54,20 @@ int OpenGateAndWait(pthread_cond_t* cond, pthread_mutex_t* mutex)
 // by Exit, must not touch what the object freed (AddressSanitizer tells).
 TEST(MThread, DeletingTheObjectOfARunningThreadIsSafe)
 {
+    // The destructor detaches the thread; the detach is only recorded, so the
+    // test can join the thread to know that it has ended.
+    static pthread_t detached;
     ScopedSysCalls restore(Sys());
-    // Left joinable, so that the test can tell when the thread has ended.
-    Sys().pthread_detach = [](pthread_t) { return 0; };
+    Sys().pthread_detach = [](pthread_t thread) { return detached = thread, 0; };
     for (bool byExit : {false, true}) {
         Gate gate;
         auto* thread = new MThread;
         ASSERT_EQ(0, thread->Create(byExit ? [](void* gate) -> void* { MThread::Exit(WaitAtGate(gate)); } : WaitAtGate,
                                     &gate, 0, 0, 0, nullptr));
         const pthread_t id = static_cast<unsigned long>(*thread);
+        detached = 0;
         delete thread;
+        EXPECT_EQ(id, detached);
         gate.open.Signal();
         EXPECT_EQ(0, pthread_join(id, nullptr));
     }
