@@ -48,6 +48,17 @@ int OpenGateAndWait(pthread_cond_t* cond, pthread_mutex_t* mutex)
     return pthread_cond_wait(cond, mutex);
 }
 
+// For a thread that detached itself: once m_finished is seen under the
+// mutex, the thread is done with the object and with the seam table.
+void WaitUntilFinished(MThread& thread)
+{
+    thread.m_mutex->Lock(nullptr);
+    while (__atomic_load_n(&thread.m_finished, __ATOMIC_RELAXED) == 0) {
+        thread.m_cond->Wait(*thread.m_mutex, nullptr, 0);
+    }
+    thread.m_mutex->Unlock(nullptr);
+}
+
 }  // namespace
 
 // The object may go while its thread runs; the thread, ending by return or
@@ -154,8 +165,8 @@ TEST(MThread, ObjectWithoutAThread)
 // Detached at Create or by Detach: the object lets go of the thread at once.
 TEST(MThread, DetachedThreadIsGivenUpAtOnce)
 {
-    static Gate gate;  // outlives the threads, which nobody waits for
     for (int atCreate : {1, 0}) {
+        Gate gate;
         MThread thread;
         ASSERT_EQ(0, thread.Create(WaitAtGate, &gate, 0, atCreate, 0, nullptr));
         if (atCreate == 0) {
@@ -169,6 +180,7 @@ TEST(MThread, DetachedThreadIsGivenUpAtOnce)
         EXPECT_FALSE(thread.Exists());
         EXPECT_EQ(-1, thread.Wait(nullptr, nullptr, 0));
         gate.open.Signal();
+        WaitUntilFinished(thread);
     }
 }
 
