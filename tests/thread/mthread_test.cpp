@@ -1,7 +1,7 @@
+#include <array>
 #include <cerrno>
 #include <csignal>
 #include <string>
-#include <thread>
 
 #include <gtest/gtest.h>
 
@@ -12,6 +12,7 @@
 #include "thread/thread_test_support.h"
 
 using tessaline::test::CaptureStderr;
+using tessaline::test::Line;
 using tessaline::test::OnOtherThread;
 using tessaline::testing::ScopedSysCalls;
 using tessaline::thread::Sys;
@@ -19,6 +20,11 @@ using tessaline::thread::Sys;
 namespace {
 
 int g_answer = 42;
+
+// What a Detach, the last error and a Wait gave while another Wait joined.
+using Refusals = std::array<int, 3>;
+MThread* g_joined = nullptr;
+Refusals g_refusals;
 
 // A routine that waits until the test opens the gate, then returns &g_answer.
 struct Gate {
@@ -32,38 +38,22 @@ void* WaitAtGate(void* gate)
     return &g_answer;
 }
 
-// A thread that pauses, five seconds if cancellable, else one; pauseStatus
-// stays 99 unless Pause returns.
-struct Pauser {
-    explicit Pauser(bool cancellable) : cancellable(cancellable) { started.Init(0); }
-    MThread thread;
-    MSemaphore started{0, 0};
-    bool cancellable;
-    int pauseStatus = 99;
-};
+// Opened by the first condition wait of a Wait: the thread then ends while
+// Wait is known to be waiting for it.
+Gate* g_openOnWait = nullptr;
 
-void* PauseLong(void* arg)
+int OpenGateAndWait(pthread_cond_t* cond, pthread_mutex_t* mutex)
 {
-    auto& pauser = *static_cast<Pauser*>(arg);
-    if (!pauser.cancellable) {
-        pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, nullptr);
-    }
-    pauser.started.Signal();
-    pauser.pauseStatus = pauser.thread.Pause(nullptr, pauser.cancellable ? 5000 : 1000);
-    return nullptr;
-}
-
-int Load(const int& field)
-{
-    return __atomic_load_n(&field, __ATOMIC_RELAXED);
+    g_openOnWait->open.Signal();
+    return pthread_cond_wait(cond, mutex);
 }
 
 // For a thread that detached itself: once m_finished is seen under the
-// mutex, the thread is done with the object.
+// mutex, the thread is done with the object and with the seam table.
 void WaitUntilFinished(MThread& thread)
 {
     thread.m_mutex->Lock(nullptr);
-    while (Load(thread.m_finished) == 0) {
+    while (__atomic_load_n(&thread.m_finished, __ATOMIC_RELAXED) == 0) {
         thread.m_cond->Wait(*thread.m_mutex, nullptr, 0);
     }
     thread.m_mutex->Unlock(nullptr);
@@ -73,74 +63,67 @@ void WaitUntilFinished(MThread& thread)
 
 // The object may go while its thread runs; the thread, ending by return or
 // by Exit, must not touch what the object freed (AddressSanitizer tells).
-// A thread-specific value's destructor reports the end: it runs once the
-// start routine has returned.
 TEST(MThread, DeletingTheObjectOfARunningThreadIsSafe)
 {
-    struct Ending {
-        Gate gate;
-        MSemaphore gone{0, 0};
-        bool byExit;
-    };
-    static pthread_key_t key;
-    // A bare post: the waiter may reuse the memory as soon as it wakes.
-    ASSERT_EQ(0, pthread_key_create(
-                     &key, [](void* ending) { MSemaphore::Cleanup(&static_cast<Ending*>(ending)->gone.m_sem); }));
+    // The destructor detaches the thread; the detach is only recorded, so the
+    // test can join the thread to know that it has ended.
+    static pthread_t detached;
+    ScopedSysCalls restore(Sys());
+    Sys().pthread_detach = [](pthread_t thread) { return detached = thread, 0; };
     for (bool byExit : {false, true}) {
-        Ending ending;
-        ending.gone.Init(0);
-        ending.byExit = byExit;
+        Gate gate;
         auto* thread = new MThread;
-        ASSERT_EQ(0, thread->Create(
-                         [](void* arg) -> void* {
-                             auto& self = *static_cast<Ending*>(arg);
-                             pthread_setspecific(key, &self);
-                             WaitAtGate(&self.gate);
-                             if (self.byExit) {
-                                 MThread::Exit(nullptr);
-                             }
-                             return nullptr;
-                         },
-                         &ending, 0, 0, 0, nullptr));
+        ASSERT_EQ(0, thread->Create(byExit ? [](void* gate) -> void* { MThread::Exit(WaitAtGate(gate)); } : WaitAtGate,
+                                    &gate, 0, 0, 0, nullptr));
+        const pthread_t id = static_cast<unsigned long>(*thread);
+        detached = 0;
         delete thread;
-        ending.gate.open.Signal();
-        EXPECT_EQ(0, ending.gone.Wait());
+        EXPECT_EQ(id, detached);
+        gate.open.Signal();
+        EXPECT_EQ(0, pthread_join(id, nullptr));
     }
-    pthread_key_delete(key);
 }
 
 TEST(MThread, TimedWaitRunsOutThenWaitJoinsAndDeliversTheResult)
 {
+    // Without a routine the thread ends at once with -1 as its result.
+    int* result = nullptr;
+    MThread empty;
+    ASSERT_EQ(0, empty.Create(nullptr, nullptr, 0, 0, 0, nullptr));
+    EXPECT_EQ(0, empty.Wait(&result, nullptr, 0));
+    EXPECT_EQ(reinterpret_cast<int*>(-1), result);
+
     Gate gate;
     MThread thread(MThread_::PriorityHigh);
     ASSERT_EQ(0, thread.Create(WaitAtGate, &gate, 64 * 1024, 0, 0, nullptr));
     EXPECT_EQ(1, thread.m_state);
     EXPECT_TRUE(thread.Exists());
-    {
-        // One object starts one thread.
-        CaptureStderr capture;
-        EXPECT_EQ(-1, thread.Create(WaitAtGate, &gate, 0, 0, 0, nullptr));
-        EXPECT_EQ(EBUSY, thread.LastError());
-        EXPECT_NE(std::string::npos, capture.Text().find("(16)\n"));
-    }
-    int* result = nullptr;
+    CaptureStderr capture;
+    // One object starts one thread.
+    EXPECT_EQ(-1, thread.Create(WaitAtGate, &gate, 0, 0, 0, nullptr));
+    EXPECT_EQ(EBUSY, thread.LastError());
+
+    ScopedSysCalls restore(Sys());
+    Sys().pthread_cond_timedwait = [](pthread_cond_t*, pthread_mutex_t*, const timespec*) { return ETIMEDOUT; };
+    result = nullptr;
     EXPECT_EQ(-5, thread.Wait(&result, nullptr, 1));
     EXPECT_EQ(ETIMEDOUT, thread.LastError());
     EXPECT_EQ(nullptr, result);
 
-    std::thread opener([&] { gate.open.Signal(); });
+    // While a Wait joins, a Detach and another Wait are refused.
+    g_joined = &thread;
+    Sys().pthread_join = [](pthread_t target, void** value) {
+        g_refusals = {g_joined->Detach(), g_joined->LastError(), g_joined->Wait(nullptr, nullptr, -1)};
+        return pthread_join(target, value);
+    };
+    gate.open.Signal();
     EXPECT_EQ(0, thread.Wait(&result, nullptr, 0));
-    opener.join();
+    EXPECT_EQ(Refusals({-1, EINVAL, -1}), g_refusals);
+    EXPECT_EQ(Line(EBUSY) + Line(EINVAL) + Line(EINVAL), capture.Text());
     EXPECT_EQ(&g_answer, result);
     EXPECT_EQ(0UL, static_cast<unsigned long>(thread));
     EXPECT_FALSE(thread.Exists());
     EXPECT_EQ(-1, thread.Wait(&result, nullptr, -1));
-
-    // Without a routine the thread ends at once with -1 as its result.
-    MThread empty;
-    ASSERT_EQ(0, empty.Create(nullptr, nullptr, 0, 0, 0, nullptr));
-    EXPECT_EQ(0, empty.Wait(&result, nullptr, 0));
-    EXPECT_EQ(reinterpret_cast<int*>(-1), result);
 }
 
 TEST(MThread, ObjectWithoutAThread)
@@ -166,31 +149,31 @@ TEST(MThread, ObjectWithoutAThread)
         EXPECT_EQ(EAGAIN, thread.LastError());
         EXPECT_EQ(0, thread.m_state);
     }
-    // Kill changes the caller's cancellation type: keep that off this thread.
     int err = 0;
-    EXPECT_EQ(-1, OnOtherThread([&] { return thread.Kill(&err); }));
+    EXPECT_EQ(-1, thread.Kill(&err));
     EXPECT_EQ(ESRCH, err);
     EXPECT_EQ("", capture.Text());
+
+    // Self adopts the calling thread, and leaves it joinable for its maker.
+    EXPECT_TRUE(OnOtherThread([] {
+        MThread host;
+        return host.Self() == MThread::ThreadID() && static_cast<unsigned long>(host) == pthread_self() &&
+               host.Exists();
+    }));
 }
 
-// Detached at Create, by Detach, or by going out through Exit, which counts
-// as cancelled: the object lets go of the thread at once.
+// Detached at Create or by Detach: the object lets go of the thread at once.
 TEST(MThread, DetachedThreadIsGivenUpAtOnce)
 {
-    for (int how : {0, 1, 2}) {
+    for (int atCreate : {1, 0}) {
         Gate gate;
         MThread thread;
-        ASSERT_EQ(0, thread.Create(how == 2 ? [](void*) -> void* { MThread::Exit(nullptr); } : WaitAtGate, &gate, 0,
-                                   how == 0, 0, nullptr));
-        if (how == 1) {
+        ASSERT_EQ(0, thread.Create(WaitAtGate, &gate, 0, atCreate, 0, nullptr));
+        if (atCreate == 0) {
             // The status is Detach's own, not an older error's.
             thread.StoreLastError(EPERM);
             EXPECT_EQ(0, thread.Detach());
             EXPECT_EQ(0, thread.LastError());
-        }
-        if (how == 2) {
-            const int status = thread.Wait(nullptr, nullptr, 0);
-            EXPECT_TRUE(status == 3 || status == -1) << status;
         }
         EXPECT_EQ(3, thread.m_state);
         EXPECT_EQ(0UL, static_cast<unsigned long>(thread));
@@ -198,64 +181,64 @@ TEST(MThread, DetachedThreadIsGivenUpAtOnce)
         EXPECT_EQ(-1, thread.Wait(nullptr, nullptr, 0));
         gate.open.Signal();
         WaitUntilFinished(thread);
-        EXPECT_EQ(how == 2 ? 1 : 0, Load(thread.m_cancelled)) << how;
     }
 }
 
-// Kill is Cancel that also leaves the caller's own cancellation as it found
-// it and never signals the process. Either ends the thread at a cancellation
-// point in its pause (Wait: 3 if it found the thread still there, -1 if it
-// had gone), or, when the request comes after the pause's last cancellation
-// point, the routine sees the flag and returns (Wait: 0).
-TEST(MThread, CancelOrKillDuringPauseEndsTheThreadOrThePause)
+// The request is made while the routine holds cancellation off, and takes
+// effect when the routine pauses: Cancel and Kill end the thread there (it
+// lets itself go, so Wait gives 3). Kill leaves its caller's own
+// cancellation as it found it and never signals the process. A routine that
+// keeps cancellation off sees the flag that Cancel set: its pause ends at
+// once with -6 and the routine returns.
+TEST(MThread, CancelAndKillTakeEffectInThePause)
 {
-    for (bool kill : {false, true}) {
-        Pauser pauser(true);
-        ASSERT_EQ(0, pauser.thread.Create(PauseLong, &pauser, 0, 0, 0, nullptr));
-        ASSERT_EQ(0, pauser.started.Wait());
-        if (kill) {
+    struct Pauser {
+        MThread thread;
+        Gate gate;
+        bool cancellable;
+        int pauseStatus = 99;
+    };
+    for (int how : {0, 1, 2}) {
+        Pauser pauser;
+        pauser.cancellable = how != 2;
+        ASSERT_EQ(0, pauser.thread.Create(
+                         [](void* arg) -> void* {
+                             auto& self = *static_cast<Pauser*>(arg);
+                             pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, nullptr);
+                             self.gate.open.Wait();
+                             pthread_setcancelstate(self.cancellable ? PTHREAD_CANCEL_ENABLE : PTHREAD_CANCEL_DISABLE,
+                                                    nullptr);
+                             self.pauseStatus = self.thread.Pause(nullptr, 5000);
+                             return nullptr;
+                         },
+                         &pauser, 0, 0, 0, nullptr));
+        if (how == 1) {
             int err = -1;
+            int state = -1;
+            int type = -1;
             EXPECT_EQ(0, OnOtherThread([&] {
                           pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, nullptr);
                           const int status = pauser.thread.Kill(&err);
-                          int state = -1;
-                          int type = -1;
                           pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &state);
                           pthread_setcanceltype(PTHREAD_CANCEL_DEFERRED, &type);
-                          EXPECT_EQ(PTHREAD_CANCEL_DISABLE, state);
-                          EXPECT_EQ(PTHREAD_CANCEL_DEFERRED, type);
                           return status;
                       }));
             EXPECT_EQ(0, err);
+            EXPECT_EQ(PTHREAD_CANCEL_DISABLE, state);
+            EXPECT_EQ(PTHREAD_CANCEL_DEFERRED, type);
         } else {
             pauser.thread.Cancel();
             EXPECT_EQ(0, pauser.thread.LastError());
         }
-        const int status = pauser.thread.Wait(nullptr, nullptr, 0);
-        if (status == 0) {
-            EXPECT_EQ(-6, pauser.pauseStatus);
-            EXPECT_EQ(1, pauser.thread.m_state);
-        } else {
-            EXPECT_TRUE(status == 3 || status == -1) << status;
-            WaitUntilFinished(pauser.thread);
-            EXPECT_EQ(99, pauser.pauseStatus);
-            EXPECT_EQ(3, pauser.thread.m_state);
-        }
-        EXPECT_EQ(1, Load(pauser.thread.m_cancelled));
-        EXPECT_EQ(0UL, static_cast<unsigned long>(pauser.thread));
+        ScopedSysCalls restore(Sys());
+        g_openOnWait = &pauser.gate;
+        Sys().pthread_cond_wait = OpenGateAndWait;
+        EXPECT_EQ(how == 2 ? 0 : 3, pauser.thread.Wait(nullptr, nullptr, 0)) << how;
+        EXPECT_EQ(how == 2 ? -6 : 99, pauser.pauseStatus);
+        EXPECT_EQ(how == 2 ? 1 : 3, pauser.thread.m_state);
+        EXPECT_EQ(1, pauser.thread.m_cancelled);
         EXPECT_FALSE(pauser.thread.Exists());
     }
-}
-
-TEST(MThread, PauseWithCancellationDisabledEndsAfterItsSlice)
-{
-    Pauser pauser(false);
-    ASSERT_EQ(0, pauser.thread.Create(PauseLong, &pauser, 0, 0, 0, nullptr));
-    ASSERT_EQ(0, pauser.started.Wait());
-    pauser.thread.Cancel();
-    EXPECT_EQ(0, pauser.thread.Wait(nullptr, nullptr, -1));
-    EXPECT_EQ(-6, pauser.pauseStatus);
-    EXPECT_EQ(1, pauser.thread.m_state);
 }
 
 TEST(MThread, CreatedThreadBlocksEverySignalButKill)
@@ -276,49 +259,10 @@ TEST(MThread, CreatedThreadBlocksEverySignalButKill)
     EXPECT_EQ(0, sigismember(&mask, SIGKILL));
 }
 
-TEST(MThread, CountsObjectsThroughCopiesAndAssignsOnlyTheThreadFields)
-{
-    const int before = __atomic_load_n(&MThread_::m_threadCnt, __ATOMIC_RELAXED);
-    {
-        Gate gate;
-        MThread first(MThread_::PriorityHigh);
-        MThread second(MThread_::PriorityLow);
-        ASSERT_EQ(0, first.Create(WaitAtGate, &gate, 0, 0, 0, nullptr));
-        MThread copy(first);
-        EXPECT_EQ(before + 3, __atomic_load_n(&MThread_::m_threadCnt, __ATOMIC_RELAXED));
-        EXPECT_EQ(1, copy.m_state);
-        EXPECT_EQ(MThread_::PriorityHigh, copy.Priority());
-
-        second = first;
-        EXPECT_EQ(static_cast<unsigned long>(first), static_cast<unsigned long>(second));
-        EXPECT_EQ(&WaitAtGate, second.m_routine);
-        EXPECT_EQ(0, second.m_state);
-        EXPECT_EQ(MThread_::PriorityLow, second.Priority());
-
-        gate.open.Signal();
-        EXPECT_EQ(0, copy.Wait(nullptr, nullptr, -1));
-        // first still names the thread that copy joined; its destructor would
-        // detach that stale identifier.
-        first.m_thread = 0;
-    }
-    EXPECT_EQ(before, __atomic_load_n(&MThread_::m_threadCnt, __ATOMIC_RELAXED));
-}
-
-TEST(MThread, SelfAdoptsTheCallingThreadWithoutDetachingIt)
-{
-    std::thread host([] {
-        MThread thread;
-        EXPECT_EQ(static_cast<unsigned long>(pthread_self()), thread.Self());
-        EXPECT_EQ(MThread::ThreadID(), static_cast<unsigned long>(thread));
-        EXPECT_TRUE(thread.Exists());
-    });
-    // Still joinable: the adopting object let it be.
-    host.join();
-}
-
 TEST(MThread, OnceRunsItsRoutineOnce)
 {
-    static int calls = 0;
+    static int calls;
+    calls = 0;
     int control = 0;
     EXPECT_EQ(0, MThread::Once([] { ++calls; }, &control));
     EXPECT_EQ(0, MThread::Once([] { ++calls; }, &control));

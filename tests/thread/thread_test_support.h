@@ -2,7 +2,12 @@
 #ifndef TESSALINE_TESTS_THREAD_THREAD_TEST_SUPPORT_H
 #define TESSALINE_TESTS_THREAD_THREAD_TEST_SUPPORT_H
 
+#include <cstdio>
+#include <cstring>
+#include <string>
 #include <thread>
+
+#include <pthread.h>
 
 namespace tessaline::test {
 
@@ -13,6 +18,15 @@ auto OnOtherThread(Body body)
     decltype(body()) result{};
     std::thread([&] { result = body(); }).join();
     return result;
+}
+
+// The line CHECK_SYSERROR writes for `code` on the calling thread.
+inline std::string Line(int code)
+{
+    char line[256];
+    std::snprintf(line, sizeof line, "Thread #%d error: %s (%d)\n", static_cast<int>(pthread_self()),
+                  std::strerror(code), code);
+    return line;
 }
 
 }  // namespace tessaline::test

@@ -38,6 +38,12 @@ TEST(RvTime, FromSecondsAndCalendarFields)
     EXPECT_EQ(kSummerNoon, rvTime(2021, 7, 15, 12, 0, 0, -1).m_time);
     // Out-of-range fields roll over: month 13 is January of the next year.
     EXPECT_EQ(rvTime(2022, 1, 15, 12, 0, 0, 0), rvTime(2021, 13, 15, 12, 0, 0, 0));
+    EXPECT_EQ(rvTimeSpan(-5), rvTime(10, true) - rvTime(15, true));
+
+    const time_t before = std::time(nullptr);
+    const rvTime now = rvTime::GetCurrentTime();
+    EXPECT_GE(now.m_time, before);
+    EXPECT_LE(now.m_time, std::time(nullptr));
 }
 
 TEST(RvTime, FromDosWords)
@@ -82,15 +88,6 @@ TEST(RvTime, BreakDownAndFormat)
         // A 32-bit time_t (32-bit x86) ends early in 2038; every instant breaks down.
         EXPECT_STREQ("2038-01-19 03:14:07", far.FormatGmt("%Y-%m-%d %H:%M:%S", out, sizeof out));
     }
-}
-
-TEST(RvTime, CurrentTimeAndDifference)
-{
-    const time_t before = std::time(nullptr);
-    const rvTime now = rvTime::GetCurrentTime();
-    EXPECT_GE(now.m_time, before);
-    EXPECT_LE(now.m_time, std::time(nullptr));
-    EXPECT_EQ(rvTimeSpan(-5), rvTime(10, true) - rvTime(15, true));
 }
 
 TEST(RvTimeSpan, Format)
