@@ -128,21 +128,27 @@ unsigned int rvConfig::IsValid()
     return m_nItems;
 }
 
-unsigned int tessaline::config::FindValue(rvConfig& config, const NameText& key, rvConfig::cfgStr* value,
-                                          const NameText& section)
+const rvConfig::cfgStr* tessaline::config::PeekValue(rvConfig& config, const NameText& key, const NameText& section)
 {
-    ScopedClassLock lock;
     // Callers look many keys up in one section in a row.
     const NameText& name = section.empty() ? NameText(config.m_strSection) : section;
     const rvConfig::SectionTable::iterator found = name.InRecent(config.m_sections);
     if (found == config.m_sections.end()) {
-        return 0;
+        return nullptr;
     }
     const rvConfig::KeyTable::iterator entry = key.In(found->second);
-    if (entry == found->second.end()) {
+    return entry == found->second.end() ? nullptr : &entry->second;
+}
+
+unsigned int tessaline::config::FindValue(rvConfig& config, const NameText& key, rvConfig::cfgStr* value,
+                                          const NameText& section)
+{
+    ScopedClassLock lock;
+    const rvConfig::cfgStr* found = PeekValue(config, key, section);
+    if (found == nullptr) {
         return 0;
     }
-    *value = entry->second;
+    *value = *found;
     return 1;
 }
 

@@ -5,6 +5,7 @@
 
 #include <cstring>
 
+#include "config/class_lock.h"
 #include "tessaline/config/rvConfig.h"
 
 namespace tessaline::config {
@@ -48,6 +49,12 @@ private:
     std::size_t m_length;
     mutable unsigned int m_fold = 0;
 };
+
+// The value of `key` in `section` ("" is the current section) as the table
+// holds it, or null. Nothing is counted: the caller reads it before the
+// entry changes.
+const rvConfig::cfgStr* PeekValue(rvConfig& config, const NameText& key, const NameText& section)
+    TESSALINE_REQUIRES(g_classLock);
 
 // _GetValue without copies of its names: 1 and the value in *value, or 0
 // with *value untouched. An empty section is the current section.

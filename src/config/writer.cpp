@@ -4,6 +4,7 @@
 #include <cstring>
 #include <ctime>
 #include <memory>
+#include <optional>
 #include <string>
 
 #include <unistd.h>
@@ -131,25 +132,30 @@ unsigned int SectionKeyCount(rvConfig& config, const rvConfig::cfgStr& name) TES
 
 // A key line of the old file: written where it stands with the table's
 // value, or dropped when the table no longer holds the key.
-void MergeKeyLine(rvConfig& config, Output& out, char* text, const rvConfig::cfgStr& running)
-    TESSALINE_REQUIRES(g_classLock)
+// `lastValue` borrows the last value written, which GetValue would have left
+// in m_strValue.
+void MergeKeyLine(rvConfig& config, Output& out, char* text, const rvConfig::cfgStr& running,
+                  std::optional<rvConfig::cfgStr>& lastValue) TESSALINE_REQUIRES(g_classLock)
 {
     char* rest;
     const char* key = KeyOfLine(config, text, &rest);
     if (*key == '\0') {
         return;
     }
-    // "" in GetValue is the current section. Below a nameless section line
+    // "" in a lookup is the current section. Below a nameless section line
     // whose section is gone, that is another section, whose keys must not be
     // pulled up here: the file would give them back in the wrong section.
     if (running.empty() && config.m_sections.find(running) == config.m_sections.end()) {
         return;
     }
-    const char* value = config.GetValue(key, static_cast<const char*>(nullptr), running.c_str());
+    // Borrowed, not counted: the saved table holds every text while the
+    // pass runs.
+    const rvConfig::cfgStr* value = PeekValue(config, NameText(key), NameText(running));
     if (value == nullptr) {
         return;
     }
-    out.PutKey(key, value);
+    out.PutKey(key, value->c_str());
+    lastValue.emplace(*value, BorrowingCopy());
     // Erase from the section the lookup searched: "" is the current one.
     // The lookup has just found both names, so neither is hashed again.
     const rvConfig::cfgStr& name = running.empty() ? config.m_strSection : running;
@@ -176,6 +182,7 @@ bool MergeOldLines(rvConfig& config, Output& out, rvConfig::cfgStr& running) TES
 {
     const std::size_t idLength = std::strlen(rvConfig::m_szIdString);
     char line[kLineBufferSize];
+    std::optional<rvConfig::cfgStr> lastValue;
     bool more = ReadLine(config.m_pFile, line);
     if (SkipByteOrderMark(line)) {
         out.Put(kByteOrderMark);
@@ -201,8 +208,11 @@ bool MergeOldLines(rvConfig& config, Output& out, rvConfig::cfgStr& running) TES
                 out.Put("]\n");
             }
         } else {
-            MergeKeyLine(config, out, text, running);
+            MergeKeyLine(config, out, text, running, lastValue);
         }
+    }
+    if (lastValue) {
+        config.m_strValue = *lastValue;
     }
     return !ReadFailed(config.m_pFile);
 }
