@@ -232,38 +232,22 @@ TEST(HostileTree, DirectoriesOnThePathAreNotEnteredAgain)
     EXPECT_EQ((std::set<std::string>{"x*"}), Shape(dir / "src")) << "links go as links; the pattern member stays";
 }
 
-TEST(HostileTree, NamesThatReadAsParentAreLeftAlone)
+TEST(HostileTree, NamesAndPlantedLinksLeadNowhereOutside)
 {
     TempDir dir;
     Populate(dir / "outside", "outside");
     const Snapshot outside = Take(dir / "outside");
     // "..." reads as file ".." with an empty extension; a backslash as "/".
-    Put(dir / "tree/...", "odd");
-    Put(dir / "tree/..\\outside\\f0", "odd");
-    Put(dir / "tree/plain", "plain");
-
-    EXPECT_EQ(1, CopyTree(dir / "tree", dir / "copy", 0));
-    EXPECT_EQ("plain", Slurp(dir / "copy/plain"));
-    EXPECT_FALSE(Exists(dir / "copy/deeper"));
-
-    EXPECT_EQ(1, rvUnlink((dir / "tree").c_str(), 1));
-    EXPECT_EQ(outside, Take(dir / "outside"));
-    EXPECT_TRUE(Exists(dir / "tree/...")) << "what the walk cannot name stays";
-}
-
-TEST(HostileTree, PlantedLinksAreReadButNeverWrittenOrEmptied)
-{
-    TempDir dir;
-    Populate(dir / "outside", "outside");
-    const Snapshot outside = Take(dir / "outside");
-
-    // The source side reads through a link, as always; a move leaves what
-    // it reached that way.
+    Put(dir / "src/...", "odd");
+    Put(dir / "src/..\\outside\\f0", "odd");
     Put(dir / "src/own", "own");
     symlink((dir / "outside").c_str(), (dir / "src/linked").c_str());
+
+    // The source side reads through a link, as always; a move leaves what
+    // it reached that way, and the odd names are not copied.
     EXPECT_EQ(7, CopyTree(dir / "src", dir / "moved", 1));
     EXPECT_EQ("outside", Slurp(dir / "moved/linked/deeper/f1"));
-    EXPECT_FALSE(Exists(dir / "src/own"));
+    EXPECT_FALSE(Exists(dir / "src/own") || Exists(dir / "moved/deeper"));
     EXPECT_EQ(outside, Take(dir / "outside"));
 
     // The target side never writes through one.
@@ -273,6 +257,11 @@ TEST(HostileTree, PlantedLinksAreReadButNeverWrittenOrEmptied)
     symlink((dir / "outside/f0").c_str(), (dir / "dst/f0").c_str());
     EXPECT_EQ(3, CopyTree(dir / "new", dir / "dst", 0)) << "f1..f3 only";
     EXPECT_EQ("new", Slurp(dir / "dst/f3"));
+
+    // Removal takes the link as a link and leaves what it cannot name.
+    Put(dir / "src/plain", "plain");
+    EXPECT_EQ(1, rvUnlink((dir / "src").c_str(), 1));
+    EXPECT_TRUE(Exists(dir / "src/...") && !Exists(dir / "src/linked"));
     EXPECT_EQ(outside, Take(dir / "outside"));
 }
 
