@@ -5,6 +5,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <set>
 #include <string>
 #include <system_error>
 
@@ -25,6 +26,18 @@ inline std::string Slurp(const std::string& path)
 {
     std::ifstream in(path, std::ios::binary);
     return in ? std::string(std::istreambuf_iterator<char>(in), {}) : "<missing>";
+}
+
+// Every path below `top`, relative: a directory with "/" behind it, a file
+// with "=" and its content.
+inline std::set<std::string> Tree(const std::string& top)
+{
+    std::set<std::string> shape;
+    for (const auto& entry : std::filesystem::recursive_directory_iterator(top)) {
+        const std::string name = entry.path().lexically_relative(top).string();
+        shape.insert(entry.is_directory() ? name + "/" : name + "=" + Slurp(entry.path().string()));
+    }
+    return shape;
 }
 
 // Also true for a dangling symbolic link.

@@ -31,18 +31,6 @@ using namespace tessaline::test;
 
 namespace {
 
-// Every path below `top`, relative: a directory with "/" behind it, a file
-// with "=" and its content.
-std::set<std::string> Take(const std::string& top)
-{
-    std::set<std::string> shape;
-    for (const auto& entry : std::filesystem::recursive_directory_iterator(top)) {
-        const std::string name = entry.path().lexically_relative(top).string();
-        shape.insert(entry.is_directory() ? name + "/" : name + "=" + Slurp(entry.path().string()));
-    }
-    return shape;
-}
-
 // Files with the names a misled walk would find: f0..f3 and deeper/f0..f1.
 void Populate(const std::string& directory, const std::string& content)
 {
@@ -168,16 +156,16 @@ TEST(HostileTree, DirectoriesOnThePathAreNotEnteredAgain)
     EXPECT_EQ((Results{3, 0, 1, 3, 0, 0}), results);
     // Each link back up and the pattern member become an empty directory.
     EXPECT_EQ((std::set<std::string>{"f=file", "pipe=", "sub/", "sub/g=deeper", "loop/", "sub/up/", "sub/self/", "x*/"}),
-              Take(dir / "dst"));
-    EXPECT_EQ((std::set<std::string>{"f=in", "copy/", "copy/f=in", "copy/copy/"}), Take(dir / "t"));
-    EXPECT_EQ((std::set<std::string>{"x*=x"}), Take(dir / "src")) << "links go as links; the pattern member stays";
+              Tree(dir / "dst"));
+    EXPECT_EQ((std::set<std::string>{"f=in", "copy/", "copy/f=in", "copy/copy/"}), Tree(dir / "t"));
+    EXPECT_EQ((std::set<std::string>{"x*=x"}), Tree(dir / "src")) << "links go as links; the pattern member stays";
 }
 
 TEST(HostileTree, NamesAndPlantedLinksLeadNowhereOutside)
 {
     TempDir dir;
     Populate(dir / "outside", "outside");
-    const auto outside = Take(dir / "outside");
+    const auto outside = Tree(dir / "outside");
     // "..." reads as file ".." with an empty extension; a backslash as "/".
     Put(dir / "src/...", "odd");
     Put(dir / "src/..\\outside\\f0", "odd");
@@ -189,7 +177,7 @@ TEST(HostileTree, NamesAndPlantedLinksLeadNowhereOutside)
     EXPECT_EQ(7, CopyTree(dir / "src", dir / "moved", 1));
     EXPECT_EQ("outside", Slurp(dir / "moved/linked/deeper/f1"));
     EXPECT_FALSE(Exists(dir / "src/own") || Exists(dir / "moved/deeper"));
-    EXPECT_EQ(outside, Take(dir / "outside"));
+    EXPECT_EQ(outside, Tree(dir / "outside"));
 
     // The target side never writes through one.
     Populate(dir / "new", "new");
@@ -203,7 +191,7 @@ TEST(HostileTree, NamesAndPlantedLinksLeadNowhereOutside)
     Put(dir / "src/plain", "plain");
     EXPECT_EQ(1, rvUnlink((dir / "src").c_str(), 1));
     EXPECT_TRUE(Exists(dir / "src/...") && !Exists(dir / "src/linked"));
-    EXPECT_EQ(outside, Take(dir / "outside"));
+    EXPECT_EQ(outside, Tree(dir / "outside"));
 }
 
 TEST(HostileTree, DirectoriesSwappedForLinksDuringTheWalk)
@@ -215,7 +203,7 @@ TEST(HostileTree, DirectoriesSwappedForLinksDuringTheWalk)
         TempDir dir;
         Populate(dir / "outside", "outside");
         Populate(dir / "outside/deeper", "outside deeper");
-        const auto outside = Take(dir / "outside");
+        const auto outside = Tree(dir / "outside");
         Populate(dir / "tree/sub", "inside");
         Populate(dir / "tree/src/sub", "inside");
         const std::pair<std::string, std::string> swaps[] = {{dir / "tree/sub", dir / "outside"},
@@ -247,7 +235,7 @@ TEST(HostileTree, DirectoriesSwappedForLinksDuringTheWalk)
         }
         stop = true;
         swapper.join();
-        ASSERT_EQ(outside, Take(dir / "outside")) << "round " << rounds;
+        ASSERT_EQ(outside, Tree(dir / "outside")) << "round " << rounds;
     }
     EXPECT_GT(rounds, 0);
 }
