@@ -1,8 +1,8 @@
 // A full disk, a file size limit and failing calls during rvCopyFile and
 // WriteFile: each case gives its result and leaves the files as listed.
+#include <algorithm>
 #include <cerrno>
 #include <climits>
-#include <algorithm>
 #include <cstring>
 #include <string>
 #include <vector>
@@ -40,20 +40,16 @@ const std::string kMissing = "<missing>";
 
 const SysCalls kReal = Sys();
 
-int Fail(int error)
-{
-    errno = error;
-    return -1;
-}
-
 bool IsTarget(const char* path)
 {
     const size_t length = std::strlen(path);
     return length >= 6 && std::strcmp(path + length - 6, "target") == 0;
 }
 
-enum Call { kOpenTarget, kOpenSource, kMkdir, kFstat, kKernelCopy, kRead, kWrite, kClose, kUnlinkTarget, kUnlinkSource };
-constexpr int kCalls = kUnlinkSource + 1;
+// clang-format off
+enum Call { kOpenTarget, kOpenSource, kMkdir, kFstat, kCopyRange, kRead, kWrite, kClose, kUnlinkTarget, kUnlinkSource,
+            kCalls };
+// clang-format on
 constexpr int kReally = INT_MAX;
 
 // From its `from`th call on, `call` fails with errno -result, or, where
@@ -68,16 +64,24 @@ struct Fault {
 std::vector<Fault> g_faults;
 int g_counts[kCalls];
 
-int Scripted(Call call)
+// Whether this call of `call` fails (errno set); else cuts `*count`.
+bool Failing(Call call, size_t* count = nullptr)
 {
-    const int count = ++g_counts[call];
+    const int number = ++g_counts[call];
     int result = kReally;
     for (const Fault& fault : g_faults) {
-        if (fault.call == call && count >= fault.from) {
+        if (fault.call == call && number >= fault.from) {
             result = fault.result;
         }
     }
-    return result;
+    if (result < 0) {
+        errno = -result;
+        return true;
+    }
+    if (count != nullptr) {
+        *count = std::min<size_t>(*count, result);
+    }
+    return false;
 }
 
 void Script(const std::vector<Fault>& faults)
@@ -85,37 +89,25 @@ void Script(const std::vector<Fault>& faults)
     g_faults = faults;
     std::fill(std::begin(g_counts), std::end(g_counts), 0);
     Sys().openat = [](int d, const char* p, int f, mode_t m) {
-        const int r = Scripted(IsTarget(p) ? kOpenTarget : kOpenSource);
-        return r < 0 ? Fail(-r) : kReal.openat(d, p, f, m);
+        return Failing(IsTarget(p) ? kOpenTarget : kOpenSource) ? -1 : kReal.openat(d, p, f, m);
     };
-    Sys().mkdir = [](const char* p, mode_t m) {
-        const int r = Scripted(kMkdir);
-        return r < 0 ? Fail(-r) : kReal.mkdir(p, m);
+    Sys().mkdir = [](const char* p, mode_t m) { return Failing(kMkdir) ? -1 : kReal.mkdir(p, m); };
+    Sys().fstat = [](int fd, struct stat* info) { return Failing(kFstat) ? -1 : kReal.fstat(fd, info); };
+    Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t n, unsigned int) -> ssize_t {
+        return Failing(kCopyRange, &n) ? -1 : kReal.copy_file_range(from, nullptr, to, nullptr, n, 0);
     };
-    Sys().fstat = [](int fd, struct stat* info) {
-        const int r = Scripted(kFstat);
-        return r < 0 ? Fail(-r) : kReal.fstat(fd, info);
+    Sys().read = [](int fd, void* data, size_t n) -> ssize_t {
+        return Failing(kRead, &n) ? -1 : kReal.read(fd, data, n);
     };
-    Sys().copy_file_range = [](int from, loff_t*, int to, loff_t*, size_t count, unsigned int) -> ssize_t {
-        const int r = Scripted(kKernelCopy);
-        return r < 0 ? Fail(-r) : kReal.copy_file_range(from, nullptr, to, nullptr, std::min<size_t>(count, r), 0);
-    };
-    Sys().read = [](int fd, void* data, size_t count) -> ssize_t {
-        const int r = Scripted(kRead);
-        return r < 0 ? Fail(-r) : kReal.read(fd, data, std::min<size_t>(count, r));
-    };
-    Sys().write = [](int fd, const void* data, size_t count) -> ssize_t {
-        const int r = Scripted(kWrite);
-        return r < 0 ? Fail(-r) : kReal.write(fd, data, std::min<size_t>(count, r));
+    Sys().write = [](int fd, const void* data, size_t n) -> ssize_t {
+        return Failing(kWrite, &n) ? -1 : kReal.write(fd, data, n);
     };
     Sys().close = [](int fd) {
-        const int r = Scripted(kClose);
         const int closed = kReal.close(fd);
-        return r < 0 ? Fail(-r) : closed;
+        return Failing(kClose) ? -1 : closed;
     };
     Sys().unlinkat = [](int d, const char* p, int f) {
-        const int r = Scripted(IsTarget(p) ? kUnlinkTarget : kUnlinkSource);
-        return r < 0 ? Fail(-r) : kReal.unlinkat(d, p, f);
+        return Failing(IsTarget(p) ? kUnlinkTarget : kUnlinkSource) ? -1 : kReal.unlinkat(d, p, f);
     };
 }
 
@@ -153,6 +145,7 @@ struct FaultCase {
 
 TEST(FaultInjection, OldDataAndResultsUnderFailures)
 {
+    // clang-format off
     const FaultCase cases[] = {
         // Failures before the target is opened leave it byte for byte.
         {"target open refused (EACCES)", {{kOpenTarget, 1, -EACCES}}, Action::Replace, 0, kOld},
@@ -165,31 +158,32 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
         // leaves no partial copy, and an old target was truncated by then.
         {"full disk: /dev/full behind the target name", {}, Action::OverDevFull, 0, kMissing},
         {"file size limit: a short write, then EFBIG",
-         {{kKernelCopy, 1, -EXDEV}, {kWrite, 1, 1000}, {kWrite, 2, -EFBIG}}, Action::Replace, 0, kMissing},
-        {"the source ends early", {{kKernelCopy, 1, -EXDEV}, {kRead, 2, 0}}, Action::Move, 0, kMissing},
+         {{kCopyRange, 1, -EXDEV}, {kWrite, 1, 1000}, {kWrite, 2, -EFBIG}}, Action::Replace, 0, kMissing},
+        {"the source ends early", {{kCopyRange, 1, -EXDEV}, {kRead, 2, 0}}, Action::Move, 0, kMissing},
         {"the source ends early under the kernel copy",
-         {{kKernelCopy, 1, 1000}, {kKernelCopy, 2, 0}, {kRead, 1, 0}}, Action::Move, 0, kMissing},
-        {"the disk fills under the kernel copy", {{kKernelCopy, 1, -ENOSPC}, {kWrite, 1, -ENOSPC}}, Action::Move, 0,
-         kMissing},
-        {"read fails (EIO)", {{kKernelCopy, 1, -EXDEV}, {kRead, 1, -EIO}}, Action::Replace, 0, kMissing},
+         {{kCopyRange, 1, 1000}, {kCopyRange, 2, 0}, {kRead, 1, 0}}, Action::Move, 0, kMissing},
+        {"the disk fills under the kernel copy",
+         {{kCopyRange, 1, -ENOSPC}, {kWrite, 1, -ENOSPC}}, Action::Move, 0, kMissing},
+        {"read fails (EIO)", {{kCopyRange, 1, -EXDEV}, {kRead, 1, -EIO}}, Action::Replace, 0, kMissing},
         {"target fails to close (EIO)", {{kClose, 2, -EIO}}, Action::Replace, 0, kMissing},  // the source closes first
         // Where the cleanup itself cannot run, the truncated target stays.
         {"the failed copy cannot be removed",
-         {{kKernelCopy, 1, -EXDEV}, {kWrite, 1, -ENOSPC}, {kUnlinkTarget, 1, -EBUSY}}, Action::Replace, 0, ""},
+         {{kCopyRange, 1, -EXDEV}, {kWrite, 1, -ENOSPC}, {kUnlinkTarget, 1, -EBUSY}}, Action::Replace, 0, ""},
 
         // The byte loop finishes what the kernel copy leaves, or does it all.
-        {"the kernel copy stops part way", {{kKernelCopy, 1, 12345}, {kKernelCopy, 2, -EXDEV}}, Action::Replace, 1,
-         kSource},
-        {"no kernel copy", {{kKernelCopy, 1, -EXDEV}}, Action::Replace, 1, kSource},
+        {"the kernel copy stops part way",
+         {{kCopyRange, 1, 12345}, {kCopyRange, 2, -EXDEV}}, Action::Replace, 1, kSource},
+        {"no kernel copy", {{kCopyRange, 1, -EXDEV}}, Action::Replace, 1, kSource},
         // A move whose source cannot be removed still counts the copy.
         {"move, source stays (EBUSY)", {{kUnlinkSource, 1, -EBUSY}}, Action::Move, 1, kSource},
 
         // WriteFile: a failed write adds nothing; a short one only what fits.
         {"WriteFile fails (EIO)", {{kWrite, 1, -EIO}}, Action::Append, -EIO, kOld},
         {"WriteFile across a file size limit", {{kWrite, 1, 2}, {kWrite, 2, -EFBIG}}, Action::Append, 2, kOld + "mo"},
-        {"WriteFile interrupted twice", {{kWrite, 1, -EINTR}, {kWrite, 3, kReally}}, Action::Append, 4,
-         kOld + "more"},
+        {"WriteFile interrupted twice",
+         {{kWrite, 1, -EINTR}, {kWrite, 3, kReally}}, Action::Append, 4, kOld + "more"},
     };
+    // clang-format on
 
     for (const FaultCase& c : cases) {
         SCOPED_TRACE(c.what);
@@ -202,19 +196,27 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
         Script(c.faults);
         int result = 0;
         switch (c.action) {
-        case Action::Replace: result = CopyOver(source, target, 1); break;
+        case Action::Replace:
+            result = CopyOver(source, target, 1);
+            break;
         case Action::Create:
             unlink(target.c_str());
             result = CopyOver(source, target, 0);
             break;
-        case Action::Move: result = CopyOver(source, target, 1, 1); break;
-        case Action::IntoNewDirectory: result = CopyOver(source, target + ".d/target", 1); break;
+        case Action::Move:
+            result = CopyOver(source, target, 1, 1);
+            break;
+        case Action::IntoNewDirectory:
+            result = CopyOver(source, target + ".d/target", 1);
+            break;
         case Action::OverDevFull:
             unlink(target.c_str());
             symlink("/dev/full", target.c_str());
             result = CopyOver(source, target, 1);
             break;
-        case Action::Append: result = Append(target); break;
+        case Action::Append:
+            result = Append(target);
+            break;
         }
         EXPECT_EQ(c.result, result);
         EXPECT_EQ(c.target, Slurp(target));

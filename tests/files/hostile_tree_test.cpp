@@ -141,7 +141,7 @@ TEST(HostileTree, DirectoriesOnThePathAreNotEnteredAgain)
     symlink(".", (dir / "src/loop").c_str());
     symlink("..", (dir / "src/sub/up").c_str());
     symlink("../sub", (dir / "src/sub/self").c_str());
-    Put(dir / "t/f", "in");  // copied into itself
+    Put(dir / "t/f", "in");                    // copied into itself
     mkfifo((dir / "src/pipe").c_str(), 0644);  // copied as its size, without waiting for a writer
 
     const auto results = InSmallThread([](Results* found) {
@@ -155,8 +155,9 @@ TEST(HostileTree, DirectoriesOnThePathAreNotEnteredAgain)
     });
     EXPECT_EQ((Results{3, 0, 1, 3, 0, 0}), results);
     // Each link back up and the pattern member become an empty directory.
-    EXPECT_EQ((std::set<std::string>{"f=file", "pipe=", "sub/", "sub/g=deeper", "loop/", "sub/up/", "sub/self/", "x*/"}),
-              Tree(dir / "dst"));
+    EXPECT_EQ(
+        (std::set<std::string>{"f=file", "pipe=", "sub/", "sub/g=deeper", "loop/", "sub/up/", "sub/self/", "x*/"}),
+        Tree(dir / "dst"));
     EXPECT_EQ((std::set<std::string>{"f=in", "copy/", "copy/f=in", "copy/copy/"}), Tree(dir / "t"));
     EXPECT_EQ((std::set<std::string>{"x*=x"}), Tree(dir / "src")) << "links go as links; the pattern member stays";
 }

@@ -49,7 +49,8 @@ TEST(CreateDir, MakesEveryMissingLevel)
     EXPECT_EQ(CreateDir("newdir", 0), 0);
     EXPECT_EQ(CreateDir("a/new", 0), 1);
     EXPECT_EQ(CreateDir("new1/new2", 0), 0);
-    for (const std::string& name : {std::string(), std::string("://"), std::string("x\\y"), tmp / std::string(10000, 'x')})
+    for (const std::string& name :
+         {std::string(), std::string("://"), std::string("x\\y"), tmp / std::string(10000, 'x')})
         EXPECT_EQ(CreateDir(name.c_str(), 0), 0) << name.substr(0, 80);
     EXPECT_EQ(CreateDir(nullptr, 0), 0);
     EXPECT_FALSE(Exists("newdir") || Exists("new1") || Exists("x\\y"));
