@@ -1,6 +1,9 @@
-// Taking names apart and putting them together with rvFilename.
+// Taking names apart and putting them together with rvFilename, and asking
+// the file system about them.
+#include <fcntl.h>
 #include <string.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <string>
 
@@ -181,6 +184,28 @@ TEST(rvFilename, DupAndComparison)
     EXPECT_FALSE(a == b || none == a);
     EXPECT_TRUE(b < a && none < otherNone);
     EXPECT_FALSE(a < b || a < upperA || none < a || a < none);
+}
+
+TEST(rvFilenameQuery, IsDirectoryAndTranslators)
+{
+    TempDir dir;
+    close(open((dir / "file").c_str(), O_CREAT | O_WRONLY | O_CLOEXEC, 0600));
+    ASSERT_EQ(symlink(dir.path().c_str(), (dir / "link").c_str()), 0);
+    for (const std::string& yes : {dir.path() + "//", dir.path() + "\\", dir / "link", std::string(10000, '/')})
+        EXPECT_EQ(rvFilename::IsDirectory(yes.c_str()), 1) << yes.substr(0, 80);
+    for (const std::string& no : {dir / "file", dir / "file/", dir / "missing" + std::string(4000, '/'), std::string()})
+        EXPECT_EQ(rvFilename::IsDirectory(no.c_str()), 0) << no.substr(0, 80);
+    EXPECT_EQ(rvFilename::IsDirectory(nullptr), 0);
+    EXPECT_EQ(rvFilename((dir / "file").c_str(), 0).Exists(F_OK), 1);
+    EXPECT_EQ(rvFilename::Exists((dir / "missing").c_str(), F_OK), 0);
+
+    // The text form keeps a URL's "://"; the rope form has no URL rule.
+    std::string text = "http://host/a/b";
+    EXPECT_STREQ(rvFilename::XlatPathToDOS(text.data()), "http://host\\a\\b");
+    EXPECT_EQ(rvFilename::XlatPathToDOS(nullptr), nullptr);
+    rvFilename::rope url("http://host/a");
+    EXPECT_EQ(rvFilename::XlatPathToDOS(url), rvFilename::rope("http:\\\\host\\a"));
+    EXPECT_EQ(rvFilename::NormalizePath(url), rvFilename::rope("http://host/a"));
 }
 
 }  // namespace

@@ -1,5 +1,8 @@
+#include <cerrno>
+#include <cstring>
 #include <string>
 
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 #include <utime.h>
@@ -7,10 +10,16 @@
 #include <gtest/gtest.h>
 
 #include "files/file_fixtures.h"
+#include "files/member_text.h"
+#include "files/sys.h"
+#include "support/capture_stderr.h"
+#include "support/scoped_sys_calls.h"
 #include "support/temp_dir.h"
 #include "tessaline/files/rvCopy.h"
+#include "tessaline/files/rvFilename.h"
 
 using namespace tessaline::test;
+using tessaline::files::Sys;
 
 namespace {
 
@@ -39,6 +48,11 @@ void MakeSourceTree(const TempDir& dir)
     Put(dir / "src/two.dat", "second");
     Put(dir / "src/sub/three.txt", "three");
     Put(dir / "src/sub/deep/four\nname", "4");
+}
+
+std::string CouldNotRemove(const std::string& path, int error)
+{
+    return "rvUnlink: Could not remove " + path + ": " + std::strerror(error) + " (" + std::to_string(error) + ").\n";
 }
 
 }  // namespace
@@ -131,4 +145,99 @@ TEST(CopyFile, WildcardsAndTrees)
     EXPECT_EQ(0, Copy("src", dir / "bare", 1, 1)) << "a bare directory name walks nothing";
     EXPECT_EQ(4, Copy("./src", dir / "dotted", 1, 1));
     EXPECT_TRUE(Exists("nomatch"));
+}
+
+TEST(Unlink, FilesTreesWildcardsAndLinks)
+{
+    TempDir dir;
+    CaptureStderr capture;
+    EXPECT_EQ(0, rvUnlink((dir / "missing").c_str(), 1));
+    const std::string readOnly = Put(dir / "read only", "x");
+    chmod(readOnly.c_str(), 0444);
+    EXPECT_EQ(1, rvUnlink(readOnly.c_str(), 0));
+    EXPECT_FALSE(Exists(readOnly));
+
+    Put(dir / "t/a.txt", "1");
+    Put(dir / "t/b.log", "2");
+    Put(dir / "t/sub/c d", "3");
+    Put(dir / "t/sub/deeper/new\nline", "4");
+    EXPECT_EQ(0, rvUnlink((dir / "t").c_str(), 0)) << "a directory needs recurse 1";
+    EXPECT_EQ(1, rvUnlink((dir / "t/*.txt").c_str(), 0));
+    EXPECT_EQ(1, rvUnlink((dir / "t/*").c_str(), 0));
+    EXPECT_TRUE(Exists(dir / "t/sub")) << "recurse 0 leaves directories";
+    EXPECT_EQ(2, rvUnlink((dir / "t/*").c_str(), 1));
+    EXPECT_TRUE(Exists(dir / "t")) << "the directory of the pattern stays";
+    EXPECT_EQ(0, rvUnlink((dir / "t").c_str(), 1)) << "an empty directory counts nothing";
+    EXPECT_FALSE(Exists(dir / "t"));
+
+    // A link to a directory goes as a link; a dangling one fails the
+    // existence test, which follows links, and stays in silence.
+    Put(dir / "real/kept", "keep");
+    symlink((dir / "real").c_str(), (dir / "to-dir").c_str());
+    symlink((dir / "gone").c_str(), (dir / "dangling").c_str());
+    EXPECT_EQ(0, rvUnlink((dir / "to-dir").c_str(), 1));
+    EXPECT_EQ(0, rvUnlink((dir / "dangling").c_str(), 1));
+    EXPECT_FALSE(Exists(dir / "to-dir"));
+    EXPECT_TRUE(Exists(dir / "real/kept") && Exists(dir / "dangling"));
+
+    // A member that cannot go is reported and skipped.
+    Put(dir / "t/stuck", "1");
+    Put(dir / "t/free", "2");
+    tessaline::testing::ScopedSysCalls restore(Sys());
+    static const auto realUnlink = Sys().unlinkat;
+    Sys().unlinkat = [](int directory, const char* name, int flags) {
+        errno = EACCES;
+        return std::strcmp(name, "stuck") == 0 ? -1 : realUnlink(directory, name, flags);
+    };
+    EXPECT_EQ(1, rvUnlink((dir / "t").c_str(), 1));
+    EXPECT_EQ((std::set<std::string>{"stuck=1"}), Tree(dir / "t"));
+    EXPECT_EQ(CouldNotRemove(dir / "t", EISDIR) + CouldNotRemove(dir / "t/stuck", EACCES), capture.Text());
+}
+
+TEST(Sizes, TreesCompareOneWayAndFilesBySize)
+{
+    TempDir dir;
+    Put(dir / "a/one", "123");
+    Put(dir / "a/sub/two", "45");
+    Put(dir / "b/one", "abc");
+    Put(dir / "b/sub/two", "de");
+    Put(dir / "b/extra", "only in b");
+    const std::string a = dir / "a";
+    const std::string b = dir / "b";
+    EXPECT_EQ(1, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "sizes, not contents";
+    EXPECT_EQ(0, CompareDirectoriesByFileSize(b.c_str(), a.c_str())) << "one-way";
+    EXPECT_EQ(1, CompareDirectoriesByFileSize((dir.path() + "\\a").c_str(), (dir.path() + "\\b\\").c_str()))
+        << "backslashes separate as slashes do";
+    EXPECT_EQ(1, CompareDirectoriesByFileSize((dir / "none").c_str(), b.c_str()));
+    EXPECT_EQ(0, CompareDirectoriesByFileSize(a.c_str(), (dir / "none").c_str()));
+    Put(dir / "b/sub/two", "longer");
+    EXPECT_EQ(0, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "a deeper size differs";
+    Put(dir / "b/sub/two", "de");
+    std::filesystem::create_directory(dir / "a/kind");
+    Put(dir / "b/kind", "");
+    EXPECT_EQ(0, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "directory against file";
+
+    EXPECT_EQ(2, rvGetFileSize((dir.path() + "\\b\\sub\\two").c_str())) << "backslashes";
+    EXPECT_EQ(0, rvGetFileSize((dir / "none").c_str()));
+    const int fd = open((dir / "a/one").c_str(), O_RDONLY | O_CLOEXEC);
+    EXPECT_EQ(3, rvGetFileSize64(reinterpret_cast<void*>(static_cast<intptr_t>(fd))));
+    close(fd);
+    EXPECT_EQ(-1, rvGetFileSize64(reinterpret_cast<void*>(static_cast<intptr_t>(-1))));
+}
+
+TEST(Unlink, MembersAreNamedAsTheFileNameJoinNamesThem)
+{
+    // The walk forms member names without asking the file system; whether
+    // the joined text is a directory must not change the name.
+    TempDir dir;
+    Put(dir / "sub/file", "");
+    for (const std::string& directory : {dir.path(), dir / "", std::string("rel/dir")}) {
+        for (const char* entry :
+             {"plain.txt", "sub", "...", "x.", "a.b.c", ".hidden", "back\\slash.e", "no_ext", "http:"}) {
+            SCOPED_TRACE(directory + " + " + entry);
+            rvFilename item(entry, 0);
+            item.Directory(directory.c_str());
+            EXPECT_EQ(std::string(item), tessaline::files::MemberText(directory.c_str(), entry));
+        }
+    }
 }
