@@ -1,20 +1,11 @@
-#include <cerrno>
-#include <cstring>
-#include <string>
 
-#include <fcntl.h>
-#include <sys/stat.h>
-#include <unistd.h>
 #include <utime.h>
-
-#include <gtest/gtest.h>
 
 #include "files/file_fixtures.h"
 #include "files/member_text.h"
 #include "files/sys.h"
 #include "support/capture_stderr.h"
 #include "support/scoped_sys_calls.h"
-#include "support/temp_dir.h"
 #include "tessaline/files/rvCopy.h"
 #include "tessaline/files/rvFilename.h"
 

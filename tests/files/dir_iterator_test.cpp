@@ -1,14 +1,8 @@
-#include <cerrno>
-#include <filesystem>
-#include <set>
-#include <string>
 
-#include <gtest/gtest.h>
 
 #include "files/file_fixtures.h"
 #include "files/sys.h"
 #include "support/scoped_sys_calls.h"
-#include "support/temp_dir.h"
 #include "tessaline/files/rvDirIterator.h"
 
 using namespace tessaline::test;

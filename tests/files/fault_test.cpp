@@ -1,22 +1,12 @@
 // A full disk, a file size limit and failing calls during rvCopyFile and
 // WriteFile: each case gives its result and leaves the files as listed.
 #include <algorithm>
-#include <cerrno>
 #include <climits>
-#include <cstring>
-#include <string>
 #include <vector>
-
-#include <fcntl.h>
-#include <sys/stat.h>
-#include <unistd.h>
-
-#include <gtest/gtest.h>
 
 #include "files/file_fixtures.h"
 #include "files/sys.h"
 #include "support/scoped_sys_calls.h"
-#include "support/temp_dir.h"
 #include "tessaline/files/rvCopy.h"
 #include "tessaline/files/rvFileApi.h"
 #include "util/sys.h"

@@ -1,23 +1,13 @@
 // File handles and the plain-named path functions.
-#include <cerrno>
-#include <cstring>
-#include <filesystem>
-#include <string>
 #include <vector>
 
-#include <fcntl.h>
 #include <limits.h>
-#include <sys/stat.h>
 #include <sys/vfs.h>
 #include <sys/wait.h>
-#include <unistd.h>
-
-#include <gtest/gtest.h>
 
 #include "files/file_fixtures.h"
 #include "files/sys.h"
 #include "support/scoped_sys_calls.h"
-#include "support/temp_dir.h"
 #include "tessaline/files/rvFileApi.h"
 #include "tessaline/files/rvPath.h"
 #include "util/sys.h"

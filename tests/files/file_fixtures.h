@@ -1,7 +1,10 @@
-// Small helpers for the file tests, beside support/temp_dir.h.
+// What every file test starts from: the usual headers, a temporary
+// directory, and small helpers to make and read files.
 #ifndef TESSALINE_TESTS_FILES_FILE_FIXTURES_H
 #define TESSALINE_TESTS_FILES_FILE_FIXTURES_H
 
+#include <cerrno>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -9,7 +12,13 @@
 #include <string>
 #include <system_error>
 
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
+
+#include <gtest/gtest.h>
+
+#include "support/temp_dir.h"
 
 namespace tessaline::test {
 

@@ -1,15 +1,7 @@
 // Taking names apart and putting them together with rvFilename, and asking
 // the file system about them.
-#include <fcntl.h>
-#include <string.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
-#include <string>
-
-#include <gtest/gtest.h>
-
-#include "support/temp_dir.h"
+#include "files/file_fixtures.h"
 #include "tessaline/files/rvFilename.h"
 
 namespace {

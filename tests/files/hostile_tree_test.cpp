@@ -6,25 +6,16 @@
 #include <array>
 #include <atomic>
 #include <chrono>
-#include <filesystem>
-#include <set>
-#include <string>
 #include <thread>
 
-#include <fcntl.h>
 #include <limits.h>
 #include <pthread.h>
 #include <stdio.h>
 #include <sys/resource.h>
-#include <sys/stat.h>
 #include <sys/wait.h>
-#include <unistd.h>
-
-#include <gtest/gtest.h>
 
 #include "files/file_fixtures.h"
 #include "support/capture_stderr.h"
-#include "support/temp_dir.h"
 #include "tessaline/files/rvCopy.h"
 
 using namespace tessaline::test;

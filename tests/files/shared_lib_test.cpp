@@ -1,15 +1,9 @@
 // Loading shared objects through rvSharedLib.
 #include <dlfcn.h>
-#include <errno.h>
 
-#include <filesystem>
-#include <string>
-
-#include <gtest/gtest.h>
-
+#include "files/file_fixtures.h"
 #include "files/sys.h"
 #include "support/scoped_sys_calls.h"
-#include "support/temp_dir.h"
 #include "tessaline/files/rvSharedLib.h"
 
 namespace {
