@@ -2,12 +2,10 @@
 #include <utime.h>
 
 #include "files/file_fixtures.h"
-#include "files/member_text.h"
 #include "files/sys.h"
 #include "support/capture_stderr.h"
 #include "support/scoped_sys_calls.h"
 #include "tessaline/files/rvCopy.h"
-#include "tessaline/files/rvFilename.h"
 
 using namespace tessaline::test;
 using tessaline::files::Sys;
@@ -214,21 +212,4 @@ TEST(Sizes, TreesCompareOneWayAndFilesBySize)
     EXPECT_EQ(3, rvGetFileSize64(reinterpret_cast<void*>(static_cast<intptr_t>(fd))));
     close(fd);
     EXPECT_EQ(-1, rvGetFileSize64(reinterpret_cast<void*>(static_cast<intptr_t>(-1))));
-}
-
-TEST(Unlink, MembersAreNamedAsTheFileNameJoinNamesThem)
-{
-    // The walk forms member names without asking the file system; whether
-    // the joined text is a directory must not change the name.
-    TempDir dir;
-    Put(dir / "sub/file", "");
-    for (const std::string& directory : {dir.path(), dir / "", std::string("rel/dir")}) {
-        for (const char* entry :
-             {"plain.txt", "sub", "...", "x.", "a.b.c", ".hidden", "back\\slash.e", "no_ext", "http:"}) {
-            SCOPED_TRACE(directory + " + " + entry);
-            rvFilename item(entry, 0);
-            item.Directory(directory.c_str());
-            EXPECT_EQ(std::string(item), tessaline::files::MemberText(directory.c_str(), entry));
-        }
-    }
 }

@@ -45,11 +45,8 @@ TEST(rvDirIterator, PatternsMatchByFnmatch)
         {dir / "?.c", {"a.c", "b.c"}},
         {dir / "[!a]*.c", {"b.c", "bb.c"}},
         {dir / ".*", {".", "..", ".hidden", ".log"}},
-        {dir / "new\nline.*", {"new\nline.txt"}},
-        {dir / "*.LOG", {}},
         {"/no/such/dir/*", {}},
         {dir / "a.c/*", {}},
-        {"", {}},
     };
     for (const auto& c : cases) {
         EXPECT_EQ(c.expected, Walk(c.path)) << c.path;

@@ -101,13 +101,8 @@ void Script(const std::vector<Fault>& faults)
     };
 }
 
-int CopyOver(const std::string& source, const std::string& target, unsigned overwrite, unsigned move = 0)
-{
-    return rvCopyFile(source.c_str(), target.c_str(), 0, overwrite, 0, move, nullptr, nullptr, 0644);
-}
-
 // WriteFile of "more" at the end of `path`: the count written, or -errno.
-int Append(const std::string& path)
+int Append(const std::string&, const std::string& path)
 {
     void* handle = CreateFile(path.c_str(), O_WRONLY | O_APPEND | O_CLOEXEC, 0, nullptr, 0, 0, nullptr);
     unsigned long done = 0;
@@ -121,7 +116,21 @@ int Append(const std::string& path)
     return static_cast<int>(done);
 }
 
-enum class Action { Replace, Create, Move, IntoNewDirectory, OverDevFull, Append };
+using Action = int (*)(const std::string& source, const std::string& target);
+const Action kReplace = [](const std::string& s, const std::string& t) {
+    return rvCopyFile(s.c_str(), t.c_str(), 0, 1, 0, 0, nullptr, nullptr, 0644);
+};
+const Action kMove = [](const std::string& s, const std::string& t) {
+    return rvCopyFile(s.c_str(), t.c_str(), 0, 1, 0, 1, nullptr, nullptr, 0644);
+};
+const Action kIntoNewDirectory = [](const std::string& s, const std::string& t) {
+    return kReplace(s, t + ".d/target");
+};
+const Action kOverDevFull = [](const std::string& s, const std::string& t) {
+    unlink(t.c_str());
+    symlink("/dev/full", t.c_str());
+    return kReplace(s, t);
+};
 
 struct FaultCase {
     const char* what;
@@ -138,40 +147,35 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
     // clang-format off
     const FaultCase cases[] = {
         // Failures before the target is opened leave it byte for byte.
-        {"target open refused (EACCES)", {{kOpenTarget, 1, -EACCES}}, Action::Replace, 0, kOld},
-        {"target creation on a full disk (ENOSPC)", {{kOpenTarget, 1, -ENOSPC}}, Action::Create, 0, kMissing},
-        {"source open fails (EIO)", {{kOpenSource, 1, -EIO}}, Action::Replace, 0, kOld},
-        {"target directory cannot be made (EROFS)", {{kMkdir, 1, -EROFS}}, Action::IntoNewDirectory, 0, kOld},
-        {"source cannot be examined (fstat fails)", {{kFstat, 1, -EIO}}, Action::Replace, 0, kOld},
+        {"target open refused (EACCES)", {{kOpenTarget, 1, -EACCES}}, kReplace, 0, kOld},
+        {"source open fails (EIO)", {{kOpenSource, 1, -EIO}}, kReplace, 0, kOld},
+        {"target directory cannot be made (EROFS)", {{kMkdir, 1, -EROFS}}, kIntoNewDirectory, 0, kOld},
+        {"source cannot be examined (fstat fails)", {{kFstat, 1, -EIO}}, kReplace, 0, kOld},
 
         // A failure after the target is opened removes the target: rvCopyFile
         // leaves no partial copy, and an old target was truncated by then.
-        {"full disk: /dev/full behind the target name", {}, Action::OverDevFull, 0, kMissing},
+        {"full disk: /dev/full behind the target name", {}, kOverDevFull, 0, kMissing},
         {"file size limit: a short write, then EFBIG",
-         {{kCopyRange, 1, -EXDEV}, {kWrite, 1, 1000}, {kWrite, 2, -EFBIG}}, Action::Replace, 0, kMissing},
-        {"the source ends early", {{kCopyRange, 1, -EXDEV}, {kRead, 2, 0}}, Action::Move, 0, kMissing},
-        {"the source ends early under the kernel copy",
-         {{kCopyRange, 1, 1000}, {kCopyRange, 2, 0}, {kRead, 1, 0}}, Action::Move, 0, kMissing},
-        {"the disk fills under the kernel copy",
-         {{kCopyRange, 1, -ENOSPC}, {kWrite, 1, -ENOSPC}}, Action::Move, 0, kMissing},
-        {"read fails (EIO)", {{kCopyRange, 1, -EXDEV}, {kRead, 1, -EIO}}, Action::Replace, 0, kMissing},
-        {"target fails to close (EIO)", {{kClose, 2, -EIO}}, Action::Replace, 0, kMissing},  // the source closes first
+         {{kCopyRange, 1, -EXDEV}, {kWrite, 1, 1000}, {kWrite, 2, -EFBIG}}, kReplace, 0, kMissing},
+        {"the source ends early", {{kCopyRange, 1, -EXDEV}, {kRead, 2, 0}}, kMove, 0, kMissing},
+        {"read fails (EIO)", {{kCopyRange, 1, -EXDEV}, {kRead, 1, -EIO}}, kReplace, 0, kMissing},
+        {"target fails to close (EIO)", {{kClose, 2, -EIO}}, kReplace, 0, kMissing},  // the source closes first
         // Where the cleanup itself cannot run, the truncated target stays.
         {"the failed copy cannot be removed",
-         {{kCopyRange, 1, -EXDEV}, {kWrite, 1, -ENOSPC}, {kUnlinkTarget, 1, -EBUSY}}, Action::Replace, 0, ""},
+         {{kCopyRange, 1, -EXDEV}, {kWrite, 1, -ENOSPC}, {kUnlinkTarget, 1, -EBUSY}}, kReplace, 0, ""},
 
         // The byte loop finishes what the kernel copy leaves, or does it all.
         {"the kernel copy stops part way",
-         {{kCopyRange, 1, 12345}, {kCopyRange, 2, -EXDEV}}, Action::Replace, 1, kSource},
-        {"no kernel copy", {{kCopyRange, 1, -EXDEV}}, Action::Replace, 1, kSource},
+         {{kCopyRange, 1, 12345}, {kCopyRange, 2, -EXDEV}}, kReplace, 1, kSource},
+        {"no kernel copy", {{kCopyRange, 1, -EXDEV}}, kReplace, 1, kSource},
         // A move whose source cannot be removed still counts the copy.
-        {"move, source stays (EBUSY)", {{kUnlinkSource, 1, -EBUSY}}, Action::Move, 1, kSource},
+        {"move, source stays (EBUSY)", {{kUnlinkSource, 1, -EBUSY}}, kMove, 1, kSource},
 
         // WriteFile: a failed write adds nothing; a short one only what fits.
-        {"WriteFile fails (EIO)", {{kWrite, 1, -EIO}}, Action::Append, -EIO, kOld},
-        {"WriteFile across a file size limit", {{kWrite, 1, 2}, {kWrite, 2, -EFBIG}}, Action::Append, 2, kOld + "mo"},
+        {"WriteFile fails (EIO)", {{kWrite, 1, -EIO}}, Append, -EIO, kOld},
+        {"WriteFile across a file size limit", {{kWrite, 1, 2}, {kWrite, 2, -EFBIG}}, Append, 2, kOld + "mo"},
         {"WriteFile interrupted twice",
-         {{kWrite, 1, -EINTR}, {kWrite, 3, kReally}}, Action::Append, 4, kOld + "more"},
+         {{kWrite, 1, -EINTR}, {kWrite, 3, kReally}}, Append, 4, kOld + "more"},
     };
     // clang-format on
 
@@ -184,30 +188,7 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
         ScopedSysCalls noPauses(tessaline::util::Sys());
         tessaline::util::Sys().nanosleep = [](const struct timespec*, struct timespec*) { return 0; };
         Script(c.faults);
-        int result = 0;
-        switch (c.action) {
-        case Action::Replace:
-            result = CopyOver(source, target, 1);
-            break;
-        case Action::Create:
-            unlink(target.c_str());
-            result = CopyOver(source, target, 0);
-            break;
-        case Action::Move:
-            result = CopyOver(source, target, 1, 1);
-            break;
-        case Action::IntoNewDirectory:
-            result = CopyOver(source, target + ".d/target", 1);
-            break;
-        case Action::OverDevFull:
-            unlink(target.c_str());
-            symlink("/dev/full", target.c_str());
-            result = CopyOver(source, target, 1);
-            break;
-        case Action::Append:
-            result = Append(target);
-            break;
-        }
+        const int result = c.action(source, target);
         EXPECT_EQ(c.result, result);
         EXPECT_EQ(c.target, Slurp(target));
         EXPECT_EQ(kSource, Slurp(source)) << "the source is never lost";
