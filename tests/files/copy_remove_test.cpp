@@ -1,6 +1,4 @@
-
-#include <utime.h>
-
+// Copying, moving, linking, removing and comparing files and trees.
 #include "files/file_fixtures.h"
 #include "files/sys.h"
 #include "support/capture_stderr.h"
@@ -9,6 +7,7 @@
 
 using namespace tessaline::test;
 using tessaline::files::Sys;
+namespace fs = std::filesystem;
 
 namespace {
 
@@ -16,18 +15,6 @@ int Copy(const std::string& source, const std::string& target, unsigned recurse,
          unsigned move = 0)
 {
     return rvCopyFile(source.c_str(), target.c_str(), recurse, overwrite, link, move, nullptr, nullptr, 0640);
-}
-
-void SetTime(const std::string& path, time_t when)
-{
-    const struct utimbuf times = {when, when};
-    utime(path.c_str(), &times);
-}
-
-std::string LinkText(const std::string& path)
-{
-    char text[4096] = {};
-    return readlink(path.c_str(), text, sizeof text - 1) > 0 ? text : "<no link>";
 }
 
 // Four files, one of them two levels down with a newline in its name.
@@ -53,18 +40,15 @@ TEST(CopyFile, SingleFilesAndTheOverwriteRules)
     const mode_t oldMask = umask(022);
     EXPECT_EQ(1, Copy(source, dir / "new/dir/copy", 0, 1)) << "parents are made";
     umask(oldMask);
-    struct stat info;
-    stat((dir / "new/dir/copy").c_str(), &info);
-    EXPECT_EQ(0640u, info.st_mode & 07777);
+    EXPECT_EQ(fs::perms(0640), fs::status(dir / "new/dir/copy").permissions());
     EXPECT_EQ(0, Copy(dir / "missing", dir / "made/x", 0, 1));
     EXPECT_EQ(0, Copy(source, dir.path(), 0, 1)) << "a directory is no single-file target";
     EXPECT_EQ(0, rvCopyFile(nullptr, "x", 0, 1, 0, 0, nullptr, nullptr, 0644));
 
     const std::string target = Put(dir / "target", "old.");
-    SetTime(source, 1000000);
-    SetTime(target, 1000000);
+    fs::last_write_time(target, fs::last_write_time(source));
     EXPECT_EQ(0, Copy(source, target, 0, 0)) << "same time and size count as up to date";
-    SetTime(target, 2000000);
+    fs::last_write_time(target, fs::last_write_time(source) + std::chrono::hours(1));
     EXPECT_EQ(1, Copy(source, target, 0, 0));
     EXPECT_EQ(1, Copy(source, dir / "fresh", 0, 0)) << "created exclusively";
     Put(dir / "longer", "longer old content");
@@ -89,16 +73,16 @@ TEST(CopyFile, LinksMovesAndRefusedSchemes)
     TempDir dir;
     const std::string source = Put(dir / "source", "text");
     EXPECT_EQ(1, Copy(source, dir / "link", 0, 1, 1));
-    EXPECT_EQ(source, LinkText(dir / "link"));
+    EXPECT_EQ(source, fs::read_symlink(dir / "link"));
     EXPECT_EQ(0, Copy(source, dir / "link", 0, 1, 1)) << "an existing target fails";
 
     MakeSourceTree(dir);
     EXPECT_EQ(1, Copy(dir / "src/*", dir / "dirlink/", 0, 1, 1)) << "one link for the directory";
-    EXPECT_EQ(dir / "src", LinkText(dir / "dirlink"));
+    EXPECT_EQ(dir / "src", fs::read_symlink(dir / "dirlink"));
     // Without the slash the directory link is tried on the parent, fails, and
     // the files are linked one by one.
     EXPECT_EQ(2, Copy(dir / "src/*", dir / "links", 0, 1, 1));
-    EXPECT_EQ(dir / "src/two.dat", LinkText(dir / "links/two.dat"));
+    EXPECT_EQ(dir / "src/two.dat", fs::read_symlink(dir / "links/two.dat"));
 
     EXPECT_EQ(4, Copy(dir / "src", dir / "moved", 1, 1, 0, 1));
     EXPECT_EQ((std::set<std::string>{"sub/", "sub/deep/"}), Tree(dir / "src")) << "source directories stay";
