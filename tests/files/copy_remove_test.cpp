@@ -48,6 +48,7 @@ TEST(CopyFile, SingleFilesAndTheOverwriteRules)
     const std::string target = Put(dir / "target", "old.");
     fs::last_write_time(target, fs::last_write_time(source));
     EXPECT_EQ(0, Copy(source, target, 0, 0)) << "same time and size count as up to date";
+    EXPECT_EQ("old.", Slurp(target));
     fs::last_write_time(target, fs::last_write_time(source) + std::chrono::hours(1));
     EXPECT_EQ(1, Copy(source, target, 0, 0));
     EXPECT_EQ(1, Copy(source, dir / "fresh", 0, 0)) << "created exclusively";

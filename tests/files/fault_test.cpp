@@ -126,6 +126,7 @@ const Action kMove = [](const std::string& s, const std::string& t) {
 const Action kIntoNewDirectory = [](const std::string& s, const std::string& t) {
     return kReplace(s, t + ".d/target");
 };
+const Action kFromMissing = [](const std::string& s, const std::string& t) { return kReplace(s + ".gone", t); };
 const Action kOverDevFull = [](const std::string& s, const std::string& t) {
     unlink(t.c_str());
     symlink("/dev/full", t.c_str());
@@ -148,6 +149,7 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
     const FaultCase cases[] = {
         // Failures before the target is opened leave it byte for byte.
         {"target open refused (EACCES)", {{kOpenTarget, 1, -EACCES}}, kReplace, 0, kOld},
+        {"missing source", {}, kFromMissing, 0, kOld},
         {"source open fails (EIO)", {{kOpenSource, 1, -EIO}}, kReplace, 0, kOld},
         {"target directory cannot be made (EROFS)", {{kMkdir, 1, -EROFS}}, kIntoNewDirectory, 0, kOld},
         {"source cannot be examined (fstat fails)", {{kFstat, 1, -EIO}}, kReplace, 0, kOld},
