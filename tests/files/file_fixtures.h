@@ -1,14 +1,24 @@
-// Small helpers for the file tests, beside support/temp_dir.h.
+// What every file test starts from: the usual headers, a temporary
+// directory, and small helpers to make and read files.
 #ifndef TESSALINE_TESTS_FILES_FILE_FIXTURES_H
 #define TESSALINE_TESTS_FILES_FILE_FIXTURES_H
 
+#include <cerrno>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <set>
 #include <string>
 #include <system_error>
 
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
+
+#include <gtest/gtest.h>
+
+#include "support/temp_dir.h"
 
 namespace tessaline::test {
 
@@ -25,6 +35,18 @@ inline std::string Slurp(const std::string& path)
 {
     std::ifstream in(path, std::ios::binary);
     return in ? std::string(std::istreambuf_iterator<char>(in), {}) : "<missing>";
+}
+
+// Every path below `top`, relative: a directory with "/" behind it, a file
+// with "=" and its content.
+inline std::set<std::string> Tree(const std::string& top)
+{
+    std::set<std::string> shape;
+    for (const auto& entry : std::filesystem::recursive_directory_iterator(top)) {
+        const std::string name = entry.path().lexically_relative(top).string();
+        shape.insert(entry.is_directory() ? name + "/" : name + "=" + Slurp(entry.path().string()));
+    }
+    return shape;
 }
 
 // Also true for a dangling symbolic link.

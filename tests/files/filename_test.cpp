@@ -1,12 +1,7 @@
-// Taking names apart and putting them together with rvFilename.
-#include <string.h>
-#include <sys/stat.h>
+// Taking names apart and putting them together with rvFilename, and asking
+// the file system about them.
 
-#include <string>
-
-#include <gtest/gtest.h>
-
-#include "support/temp_dir.h"
+#include "files/file_fixtures.h"
 #include "tessaline/files/rvFilename.h"
 
 namespace {
@@ -60,6 +55,8 @@ const SplitRow kSplitRows[] = {
     {"file:////etc/hosts", "file", kNull, "/etc", "hosts", kNull, "/etc/hosts", "hosts", ""},
     {"http:///dir/f.txt", "http", "dir", "/", "f", "txt", "/f.txt", "f.txt", ""},
     {"http://host///d/f", "http", kNull, "/host///d", "f", kNull, "/host///d/f", "f", ""},
+    // Backslashes cut nothing; only the stored text is turned.
+    {"C:\\temp\\x.txt", kNull, kNull, kNull, "C:\\temp\\x", "txt", "C:/temp/x.txt", "C:/temp/x.txt", ""},
 };
 
 TEST(rvFilenameSplit, WorkedNames)
@@ -88,15 +85,6 @@ TEST(rvFilenameSplit, MoreNames)
     TempDir existing;
     const char* dir = existing.path().c_str();
     {
-        // Backslashes cut nothing; only the stored text is turned.
-        rvFilename name("C:\\temp\\x.txt", 0);
-        EXPECT_EQ(name.m_pDirectory, nullptr);
-        EXPECT_STREQ(name.File(), "C:\\temp\\x");
-        EXPECT_STREQ(name.Ext(), "txt");
-        EXPECT_STREQ(name(), "C:/temp/x.txt");
-        EXPECT_STREQ(rvFilename("mailto:x", 0).File(), "mailto:x");
-    }
-    {
         // Remote names are never taken whole as directories.
         rvFilename remote("/tmp", 1);
         EXPECT_STREQ(remote.Directory(), "/");
@@ -104,23 +92,19 @@ TEST(rvFilenameSplit, MoreNames)
         EXPECT_EQ(rvFilename("https://h/a", 0).m_remote, 1u);
         EXPECT_EQ(rvFilename("FTPS://h/a", 0).m_remote, 1u);
         EXPECT_EQ(rvFilename("file://h/a", 0).m_remote, 0u);
-
         rvFilename once("http://host/a", 0);
         once = dir;
-        EXPECT_EQ(once.m_remote, 1u);
-        EXPECT_STRNE(once.Directory(), dir);
-        rvFilename copy(once);
-        EXPECT_EQ(copy.m_remote, 0u);
-        EXPECT_STREQ(copy.Directory(), dir);
+        EXPECT_STRNE(once.Directory(), dir) << "an object stays remote";
+        EXPECT_STREQ(rvFilename(once).Directory(), dir) << "a copy does not";
     }
     {
+        // The same text, in any case, keeps the stored one.
         rvFilename name("a/b", 0);
         const char* before = name();
         name = "A/B";
         EXPECT_EQ(name(), before);
         name = "d";
         EXPECT_EQ(name.m_pDirectory, nullptr);
-        EXPECT_STREQ(name.File(), "d");
     }
     {
         // A re-split that finds a directory keeps the file and extension.
@@ -130,6 +114,14 @@ TEST(rvFilenameSplit, MoreNames)
         EXPECT_EQ(name.Directory(), existing / "entry.d");
         EXPECT_STREQ(name.File(), "entry");
         EXPECT_STREQ(name.Ext(), "d");
+    }
+    {
+        // Text past the 4094th character takes no part in the split but stays.
+        rvFilename name(("/\\" + std::string(9996, 'a') + "\\z").c_str(), 0);
+        EXPECT_STREQ(name.Directory(), "/");
+        EXPECT_EQ(strlen(name.File()), 4093u);
+        EXPECT_EQ(strlen(name()), 10000u);
+        EXPECT_EQ(name()[9998], '\\');
     }
 }
 
@@ -146,7 +138,6 @@ TEST(rvFilenameJoin, SeparatorsAndSetters)
     rvFilename name("/a/b.txt", 0);
     EXPECT_STREQ(name.Ext("dat"), "/a/b.dat");
     EXPECT_STREQ(name.Ext(nullptr), "/a/b");
-    EXPECT_EQ(name.m_pExt, nullptr);
     name = "/a/b.txt";
     EXPECT_STREQ(name.File("c.d"), "/a/c.d.txt");
     EXPECT_STREQ(name.File(), "c.d");
@@ -161,16 +152,6 @@ TEST(rvFilenameJoin, SeparatorsAndSetters)
     EXPECT_STREQ(bare(), "report");
 }
 
-TEST(rvFilenameJoin, ArgumentsMayPointIntoTheObject)
-{
-    rvFilename name("/a/b.txt", 0);
-    EXPECT_STREQ(name.File(name.m_pFile), "/a/b.txt");
-    EXPECT_STREQ(name.Directory(name.Directory()), "/a/b.txt");
-    EXPECT_STREQ(name.Join(nullptr, nullptr, name.Pathname(), nullptr, nullptr), "/a/b.txt/");
-    name = name.Filename();
-    EXPECT_STREQ(name(), "b.txt/");
-}
-
 TEST(rvFilename, DupAndComparison)
 {
     rvFilename name;
@@ -181,9 +162,6 @@ TEST(rvFilename, DupAndComparison)
     EXPECT_EQ(std::string(copy, 12), std::string("ab\0\0\0\0\0\0\0\0\0\0", 12));
     delete[] copy;
     EXPECT_EQ(name.Dup(nullptr, 5), nullptr);
-    char* field = name.Dup("old", -1);
-    EXPECT_STREQ(name.Dup(&field, field + 1, -1), "ld");
-    delete[] field;
 
     // Equal ignoring case; "less" sorts descending, and two empty objects
     // are both equal and less.
@@ -194,54 +172,26 @@ TEST(rvFilename, DupAndComparison)
     EXPECT_FALSE(a < b || a < upperA || none < a || a < none);
 }
 
-TEST(rvFilename, ObjectsWithoutText)
+TEST(rvFilenameQuery, IsDirectoryAndTranslators)
 {
-    rvFilename name;
-    for (const char* part : {name(), name.URL(), name.Pathname(), name.Filename(), name.Scheme(), name.Ext()})
-        EXPECT_STREQ(part, "");
-    EXPECT_EQ(name.IsDirectory(), 0);
-    EXPECT_EQ(name.Exists(0), 0);
-    EXPECT_EQ(name.Empty(nullptr), 1);
-    name.Split(nullptr);
+    TempDir dir;
+    close(open((dir / "file").c_str(), O_CREAT | O_WRONLY | O_CLOEXEC, 0600));
+    ASSERT_EQ(symlink(dir.path().c_str(), (dir / "link").c_str()), 0);
+    for (const std::string& yes : {dir.path() + "//", dir.path() + "\\", dir / "link", std::string(10000, '/')})
+        EXPECT_EQ(rvFilename::IsDirectory(yes.c_str()), 1) << yes.substr(0, 80);
+    for (const std::string& no : {dir / "file", dir / "file/", dir / "missing" + std::string(4000, '/'), std::string()})
+        EXPECT_EQ(rvFilename::IsDirectory(no.c_str()), 0) << no.substr(0, 80);
+    EXPECT_EQ(rvFilename::IsDirectory(nullptr), 0);
+    EXPECT_EQ(rvFilename((dir / "file").c_str(), 0).Exists(F_OK), 1);
+    EXPECT_EQ(rvFilename::Exists((dir / "missing").c_str(), F_OK), 0);
 
-    name = "/a/b.txt";
-    EXPECT_EQ(name.Empty(nullptr), 0);
-    EXPECT_EQ(name.Empty(""), 1);
-    name = static_cast<const char*>(nullptr);
-    EXPECT_EQ(name.m_pPath, nullptr);
-    EXPECT_EQ(name.m_pFile, nullptr);
-    name = "";
-    EXPECT_STREQ(name.Filename(), "");
-}
-
-TEST(rvFilename, AwkwardTexts)
-{
-    {
-        // Text past the 4094th character takes no part in the split but stays.
-        rvFilename name(("/\\" + std::string(9996, 'a') + "\\z").c_str(), 0);
-        EXPECT_STREQ(name.Directory(), "/");
-        EXPECT_EQ(strlen(name.File()), 4093u);
-        EXPECT_EQ(strlen(name()), 10000u);
-        EXPECT_EQ(name()[1], '/');
-        EXPECT_EQ(name()[9998], '\\');
-    }
-    {
-        rvFilename slashes(std::string(10000, '/').c_str(), 0);
-        EXPECT_STREQ(slashes.Server(), "");
-        EXPECT_STREQ(slashes.Directory(), "/");
-        rvFilename backslashes(std::string(10000, '\\').c_str(), 0);
-        EXPECT_EQ(strlen(backslashes.File()), 4094u);
-        EXPECT_EQ(std::string(backslashes()).find('\\'), 4095u);
-    }
-    {
-        rvFilename separator("://", 0);
-        EXPECT_STREQ(separator.m_pScheme, "");
-        EXPECT_STREQ(separator.m_pServer, "");
-        EXPECT_STREQ(separator.URL(), "://");
-        rvFilename server(("http://" + std::string(5000, 'h') + "/d/f.x").c_str(), 0);
-        EXPECT_EQ(strlen(server.Server()), 4087u);
-        EXPECT_STREQ(server.m_pDirectory, "");
-    }
+    // The text form keeps a URL's "://"; the rope form has no URL rule.
+    std::string text = "http://host/a/b";
+    EXPECT_STREQ(rvFilename::XlatPathToDOS(text.data()), "http://host\\a\\b");
+    EXPECT_EQ(rvFilename::XlatPathToDOS(nullptr), nullptr);
+    rvFilename::rope url("http://host/a");
+    EXPECT_EQ(rvFilename::XlatPathToDOS(url), rvFilename::rope("http:\\\\host\\a"));
+    EXPECT_EQ(rvFilename::NormalizePath(url), rvFilename::rope("http://host/a"));
 }
 
 }  // namespace
