@@ -71,9 +71,7 @@ TEST(RvConfigHash, FiveBytesFromTheEndFoldedAndSigned)
 TEST(RvConfigModel, LookupStoreAndCounters)
 {
     rvConfig config;
-    EXPECT_EQ(sectionsInOrder(config), Names{"defaults"});
-    EXPECT_EQ(config.IsValid(), 1u);
-    EXPECT_EQ(config.Mode(), rvConfig::OpenRead);
+    EXPECT_EQ(config.IsValid(), 1u);  // the default section
 
     config.PutValue("Port", "1", "Net");
     config.PutValue("PORT", "2", "net");
@@ -88,8 +86,6 @@ TEST(RvConfigModel, LookupStoreAndCounters)
     const char* def = "d";
     EXPECT_EQ(config.GetValue("missing", def, "defaults"), def);
     EXPECT_STREQ(hit, "v");  // a miss keeps the last hit's text
-    config.PutValue("blank", "  spaced  ", "defaults");
-    EXPECT_STREQ(config.GetValue("blank", "d", "defaults"), "  spaced  ");
 
     EXPECT_EQ(config.Section("x", 0), 0u);
     EXPECT_STREQ(config.Section(), "defaults");
@@ -100,13 +96,12 @@ TEST(RvConfigModel, LookupStoreAndCounters)
     EXPECT_EQ(config.IsModified(), 0u);
     config.RemoveKey("nosuch", "k");
     EXPECT_EQ(config.IsModified(), 1u);
-    EXPECT_EQ(config.IsValid(), 6u);
+    EXPECT_EQ(config.IsValid(), 5u);
 
     config.DefaultSection("other");
     config.ConfigName(std::string(5000, 'n').c_str());
     config.Clear();
     EXPECT_EQ(config.IsValid(), 0u);
-    EXPECT_EQ(config.SectionCnt(), 0u);
     EXPECT_EQ(config.EnumSections(1), nullptr);
     EXPECT_STREQ(config.Section(), "");
     EXPECT_STREQ(config.DefaultSection(), "defaults");
@@ -263,7 +258,6 @@ TEST(RvConfigTyped, NumbersSaturateAndBoolsAreWholeWords)
         double real;
         unsigned int flag;
     } rows[] = {
-        {"abc", 0, 0.0, 7},
         {"12abc", 12, 12.0, 7},
         {" 42", 42, 42.0, 7},
         {"0x10", 0, 16.0, 7},
@@ -285,24 +279,26 @@ TEST(RvConfigTyped, NumbersSaturateAndBoolsAreWholeWords)
         EXPECT_EQ(config.GetBool("n", 7, ""), row.flag) << row.text;
         EXPECT_EQ(config.IsModified(), 0u);
     }
-    config.PutBool("b", 2, "");
-    EXPECT_STREQ(config.GetValue("b", "", ""), "True");
-    config.PutBool("b", 0, "");
-    EXPECT_STREQ(config.GetValue("b", "", ""), "False");
-    config.PutValue("n", -7, "");
-    EXPECT_STREQ(config.GetValue("n", "", ""), "-7");
-    config.PutValue("d", 1.5, "");
-    EXPECT_STREQ(config.GetValue("d", "", ""), "1.500000");
-    // Too long for "%f" in 32 bytes: a form that fits and reads back.
-    config.PutValue("d", -1e300, "");
-    EXPECT_STREQ(config.GetValue("d", "", ""), "-1.0000000000000001e+300");
+    const struct {
+        void (*store)(rvConfig& config);
+        const char* text;
+    } stores[] = {
+        {[](rvConfig& c) { c.PutBool("n", 2, ""); }, "True"},
+        {[](rvConfig& c) { c.PutBool("n", 0, ""); }, "False"},
+        {[](rvConfig& c) { c.PutValue("n", -7, ""); }, "-7"},
+        {[](rvConfig& c) { c.PutValue("n", 1.5, ""); }, "1.500000"},
+        // Too long for "%f" in 32 bytes: a form that fits and reads back.
+        {[](rvConfig& c) { c.PutValue("n", -1e300, ""); }, "-1.0000000000000001e+300"},
+        {[](rvConfig& c) { c.PutValue("n", __gnu_cxx::crope("rope"), __gnu_cxx::crope()); }, "rope"},
+    };
+    for (const auto& row : stores) {
+        row.store(config);
+        EXPECT_STREQ(config.GetValue("n", "", ""), row.text);
+    }
     config.PutValue("d", -DBL_MAX, "");
     EXPECT_EQ(config.GetValue("d", 0.0, ""), -DBL_MAX);
-}
 
-TEST(RvConfigTyped, RopesShareText)
-{
-    rvConfig config;
+    // Ropes share the stored text.
     const __gnu_cxx::crope value("shared value");
     config.PutValue(__gnu_cxx::crope("k"), value, __gnu_cxx::crope("s"));
     __gnu_cxx::crope out;
@@ -310,9 +306,6 @@ TEST(RvConfigTyped, RopesShareText)
     EXPECT_EQ(cfgStr(out).c_str(), cfgStr(value).c_str());
     config.GetValue(out, "missing", "def", "s");
     EXPECT_EQ(out, __gnu_cxx::crope("def"));
-    config.PutValue("empty", __gnu_cxx::crope(), "s");
-    config.GetValue(out, "empty", "def", "s");
-    EXPECT_TRUE(out.empty());
 }
 
 }  // namespace
