@@ -3,7 +3,7 @@
 #include <cerrno>
 #include <filesystem>
 #include <fstream>
-#include <functional>
+#include <initializer_list>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -20,13 +20,27 @@ namespace {
 
 using tessaline::test::body;
 using tessaline::test::ConfigDir;
-using Change = std::function<void(rvConfig&)>;
+// One change to the table: a store, or with no value the removal of the key,
+// or with no key either the removal of the section.
+struct Edit {
+    const char* section;
+    const char* key;
+    const char* value;
+};
 
-std::string rewrite(const std::string& content, const Change& change)
+std::string rewrite(const std::string& content, std::initializer_list<Edit> edits)
 {
     ConfigDir dir;
     rvConfig config(dir.Write("app.ini", content).c_str(), rvConfig::OpenUpdate);
-    change(config);
+    for (const Edit& edit : edits) {
+        if (edit.key == nullptr) {
+            config.RemoveSection(edit.section);
+        } else if (edit.value == nullptr) {
+            config.RemoveKey(edit.section, edit.key);
+        } else {
+            config.PutValue(edit.key, edit.value, edit.section);
+        }
+    }
     config.IsModified(1);
     EXPECT_EQ(config.Flush(0), 1u);
     EXPECT_FALSE(dir.Exists("app.new"));
@@ -37,85 +51,60 @@ TEST(RvConfigWriter, WorkedCaseLineForLine)
 {
     EXPECT_EQ(rewrite("# comment\na = 1\n\n[s1]\nb = 2\nc = 3\n# second\n[s2]\nd = 4\n"
                       "# Edited by Tessaline: January 01, 2020 - 00:00:00\n",
-                      [](rvConfig& c) {
-                          c.PutValue("e", "5", "");
-                          c.PutValue("b", "22", "s1");
-                          c.PutValue("f", "6", "s1");
-                          c.RemoveKey("s1", "c");
-                          c.PutValue("g", "7", "s3");
-                      }),
+                      {{"", "e", "5"}, {"s1", "b", "22"}, {"s1", "f", "6"}, {"s1", "c", nullptr}, {"s3", "g", "7"}}),
               "# comment\na = 1\n\ne = 5\n[s1]\nb = 22\n# second\nf = 6\n[s2]\nd = 4\n[s3]\ng = 7\n");
 }
 
 TEST(RvConfigWriter, LayoutSurvives)
 {
-    const Change none = [](rvConfig&) {};
     const struct {
         const char* old;
-        Change change;
+        std::initializer_list<Edit> edits;
         const char* expected;
     } rows[] = {
         // Only blank lines keep their carriage returns and blanks.
-        {"  # indented\r\n \t \r\n[Net]\nPort=\"80\"\n", none, "  # indented\n \t \r\n[Net]\nPort = 80\n"},
-        {"[a]\n# about a\nk = 1\n[b]\nj = 2\n", [](rvConfig& c) { c.RemoveSection("a"); }, "# about a\n[b]\nj = 2\n"},
-        {"[s]\nx = 1\n[t]\nk = 1\n[S]\n# 2nd\ny = 2\nx = 3\n", none, "[s]\nx = 1\ny = 2\n[t]\nk = 1\n# 2nd\n"},
-        {"[s]\nPORT = 1\n",
-         [](rvConfig& c) {
-             c.PutValue("port", "2", "s");
-             c.PutValue("Host", "h", "S");
-         },
-         "[s]\nPORT = 2\nHost = h\n"},
-        {"k\nk = 1\nempty =\nk = 2\n", none, "k = 1\n"},
-        {"# EDITED BY TESSALINE: x\nk = 1\n# Edited by Tessaline\n", none, "k = 1\n"},
-        {"# c\nk = 1\n\n[s]\nj = 2\n",
-         [](rvConfig& c) {
-             c.RemoveKey("defaults", "k");
-             c.RemoveSection("s");
-         },
-         "# c\n\n"},
+        {"  # indented\r\n \t \r\n[Net]\nPort=\"80\"\n", {}, "  # indented\n \t \r\n[Net]\nPort = 80\n"},
+        {"[a]\n# about a\nk = 1\n[b]\nj = 2\n", {{"a", nullptr, nullptr}}, "# about a\n[b]\nj = 2\n"},
+        {"[s]\nx = 1\n[t]\nk = 1\n[S]\n# 2nd\ny = 2\nx = 3\n", {}, "[s]\nx = 1\ny = 2\n[t]\nk = 1\n# 2nd\n"},
+        {"[s]\nPORT = 1\n", {{"s", "port", "2"}, {"S", "Host", "h"}}, "[s]\nPORT = 2\nHost = h\n"},
+        {"k\nk = 1\nempty =\nk = 2\n", {}, "k = 1\n"},
+        {"# EDITED BY TESSALINE: x\nk = 1\n# Edited by Tessaline\n", {}, "k = 1\n"},
+        {"# c\nk = 1\n\n[s]\nj = 2\n", {{"defaults", "k", nullptr}, {"s", nullptr, nullptr}}, "# c\n\n"},
         {"top = 1\n# before s\n[s]\nk = 1\n\n# before t\n[t]\nj = 1\n",
-         [](rvConfig& c) {
-             c.PutValue("new", "d", "");
-             c.PutValue("new", "s", "s");
-             c.PutValue("new", "t", "t");
-         },
+         {{"", "new", "d"}, {"s", "new", "s"}, {"t", "new", "t"}},
          "top = 1\n# before s\nnew = d\n[s]\nk = 1\n\n# before t\nnew = s\n[t]\nj = 1\nnew = t\n"},
-        // The nameless section's header survives with its keys. Once that
-        // section is gone, its old key lines go too and never take a key of
-        // the current section with the same name, which would then read back
-        // in another section.
         // A byte order mark opens the file again, before the keys drained
         // ahead of the first section line; elsewhere it is text.
         {"\xEF\xBB\xBF[main]\nport = 80\n",
-         [](rvConfig& c) {
-             c.PutValue("port", "81", "main");
-             c.PutValue("top", "1", "");
-         },
+         {{"main", "port", "81"}, {"", "top", "1"}},
          "\xEF\xBB\xBFtop = 1\n[main]\nport = 81\n"},
-        {"k = 1\n\xEF\xBB\xBFk = 2\n", none, "k = 1\n\xEF\xBB\xBFk = 2\n"},
-        {"[]\nk = 1\n", none, "[]\nk = 1\n"},
-        {"top = 1\n[]\nk = 1\n",
-         [](rvConfig& c) {
-             c.RemoveSection("");
-             c.PutValue("k", "2", "x");
-             c.Section("x", 0);
-         },
-         "top = 1\n[x]\nk = 2\n"},
+        {"k = 1\n\xEF\xBB\xBFk = 2\n", {}, "k = 1\n\xEF\xBB\xBFk = 2\n"},
+        // The nameless section's header survives with its keys.
+        {"[]\nk = 1\n", {}, "[]\nk = 1\n"},
         // New keys and sections in table order; empty sections never appear.
         {"",
-         [](rvConfig& c) {
-             c.PutValue("k", "1", "");
-             c.PutValue("port", "1", "n");
-             c.PutValue("timeout", "2", "n");
-             c.Section("empty", 1);
-             c.PutValue("k", "v", "b");
-             c.PutValue("k", "v", "a");
-         },
+         {{"", "k", "1"},
+          {"n", "port", "1"},
+          {"n", "timeout", "2"},
+          {"empty", "k", "v"},
+          {"empty", "k", nullptr},
+          {"b", "k", "v"},
+          {"a", "k", "v"}},
          "k = 1\n[a]\nk = v\n[b]\nk = v\n[n]\ntimeout = 2\nport = 1\n"},
     };
     for (const auto& row : rows) {
-        EXPECT_EQ(rewrite(row.old, row.change), row.expected) << row.old;
+        EXPECT_EQ(rewrite(row.old, row.edits), row.expected) << row.old;
     }
+    // Once the nameless section is gone, its old key lines go too and never
+    // take a key of the current section with the same name, which would then
+    // read back in another section.
+    ConfigDir dir;
+    rvConfig config(dir.Write("app.ini", "top = 1\n[]\nk = 1\n").c_str(), rvConfig::OpenUpdate);
+    config.RemoveSection("");
+    config.PutValue("k", "2", "x");
+    config.Section("x", 0);
+    ASSERT_EQ(config.Flush(0), 1u);
+    EXPECT_EQ(body(dir.Read("app.ini")), "top = 1\n[x]\nk = 2\n");
 }
 
 TEST(RvConfigWriter, TextGoesOutUnescaped)
@@ -164,13 +153,6 @@ TEST(RvConfigWriter, FlushStates)
     rvConfig::m_bBackups = 0;
     EXPECT_EQ(body(dir.Read("fresh")), "k = 1\n[s]\nj = 2\n");
     EXPECT_FALSE(dir.Exists("fresh.bak"));
-
-    // OpenWrite empties the old file first: no comments survive.
-    rvConfig written(dir.Write("write.ini", "# gone\nk = 1\n").c_str(), rvConfig::OpenUpdate);
-    written.Mode(rvConfig::OpenWrite);
-    written.PutValue("k", "2", "");
-    ASSERT_EQ(written.Flush(0), 1u);
-    EXPECT_EQ(body(dir.Read("write.ini")), "k = 2\n");
 }
 
 TEST(RvConfigWriter, BackupsNeverTakeTheFilesOwnName)
