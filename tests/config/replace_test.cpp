@@ -15,7 +15,6 @@
 
 #include "config/sys.h"
 #include "config/temp_dir.h"
-#include "config/written_text.h"
 #include "support/capture_stderr.h"
 #include "support/scoped_sys_calls.h"
 #include "tessaline/config/rvConfig.h"

@@ -5,10 +5,13 @@
 
 #include <fstream>
 #include <iterator>
+#include <regex>
 #include <string>
 
 #include <sys/stat.h>
 #include <unistd.h>
+
+#include <gtest/gtest.h>
 
 #include "support/temp_dir.h"
 
@@ -45,6 +48,18 @@ public:
         return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
     }
 };
+
+// A written file's text without its identification line, which must be the
+// only one and the last line.
+inline std::string body(const std::string& text)
+{
+    static const std::regex idLine("# Edited by Tessaline: [A-Z][a-z]+ [0-9]{2}, [0-9]{4} - [0-9:]{8}\n$");
+    std::smatch match;
+    EXPECT_TRUE(std::regex_search(text, match, idLine)) << text;
+    const std::string rest = text.substr(0, text.size() - match.length());
+    EXPECT_EQ(rest.find("Edited by"), std::string::npos) << text;
+    return rest;
+}
 
 }  // namespace tessaline::test
 
