@@ -89,22 +89,14 @@ TEST(RvConfigReader, SingleLines)
 TEST(RvConfigReader, SectionsMergeAndLoadStartsAfresh)
 {
     ConfigDir dir;
-    const std::string path = dir.Write("app.ini",
-                                       "top = 1\n"
-                                       "[Net]\n"
-                                       "Port = 80\n"
-                                       "port = 81\n"
-                                       "[empty]\n"
-                                       "[NET]\n"
-                                       "host = h\n"
-                                       "[defaults]\n"
-                                       "last = no newline");
+    const std::string text = "top = 1\n[Net]\nPort = 80\nport = 81\n[empty]\n[NET]\nhost = h\n[defaults]\nlast = x";
+    const std::string path = dir.Write("app.ini", text);
     rvConfig config;
     config.PutValue("old", "x", "gone");
     config.DefaultSection("other");
     ASSERT_EQ(config.Load(path.c_str(), rvConfig::OpenRead), 1u);
-    EXPECT_STREQ(lookup(config, "top", "other"), "1");  // the default section of the object at the time
-    EXPECT_STREQ(lookup(config, "last", "defaults"), "no newline");
+    EXPECT_STREQ(lookup(config, "top", "other"), "1");      // the default section of the object at the time
+    EXPECT_STREQ(lookup(config, "last", "defaults"), "x");  // without a line end
     EXPECT_STREQ(lookup(config, "port", "net"), "80");
     EXPECT_EQ(config.TokenCnt("net"), 2u);
     EXPECT_EQ(config.TokenCnt("gone"), 0u);
@@ -115,20 +107,16 @@ TEST(RvConfigReader, SectionsMergeAndLoadStartsAfresh)
     EXPECT_STREQ(config.Section(), "defaults");
     EXPECT_STREQ(config.DefaultSection(), "defaults");
 
-    ASSERT_EQ(config.Load(dir.Write("comments.ini", "# only\n\n; comments\n").c_str(), rvConfig::OpenRead), 1u);
-    EXPECT_EQ(config.IsValid(), 0u);
-    EXPECT_EQ(config.SectionCnt(), 1u);
-
     // Many sections whose keys repeat in other spellings: each keeps its own.
-    std::string text;
+    std::string many;
     const char* spellings[] = {"port", "Port", "PORT"};
     for (int section = 0; section < 30; ++section) {
-        text += "[s" + std::to_string(section) + "]\n" + spellings[section % 3] + " = p\n";
+        many += "[s" + std::to_string(section) + "]\n" + spellings[section % 3] + " = p\n";
         for (int key = 0; key < 40; ++key) {
-            text += "k" + std::to_string(section * 7 + key) + " = v\n";
+            many += "k" + std::to_string(section * 7 + key) + " = v\n";
         }
     }
-    ASSERT_EQ(config.Load(dir.Write("many.ini", text).c_str(), rvConfig::OpenRead), 1u);
+    ASSERT_EQ(config.Load(dir.Write("many.ini", many).c_str(), rvConfig::OpenRead), 1u);
     for (int section = 0; section < 30; ++section) {
         const std::string name = "s" + std::to_string(section);
         std::string keys = ",";
