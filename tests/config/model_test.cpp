@@ -249,7 +249,7 @@ TEST(RvConfigTyped, NumbersSaturateAndBoolsAreWholeWords)
     }
     __gnu_cxx::crope out;
     config.GetValue(out, __gnu_cxx::crope("N"), __gnu_cxx::crope("def"), __gnu_cxx::crope(""));
-    EXPECT_EQ(out, __gnu_cxx::crope("rope"));
+    EXPECT_STREQ(out.c_str(), "rope");
 }
 
 }  // namespace
