@@ -1,7 +1,6 @@
 // Saving: the merge of table and old file, side files, links, and what each
 // failure leaves on disk and in memory.
 #include <cerrno>
-#include <climits>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
@@ -75,7 +74,7 @@ int TempFileRenameFails(const char* from, const char* to)
 }
 
 // What app.ini, app.bak and app.new hold afterwards, in this order: O the
-// old text byte for byte, N the new text, - nothing, ? not checked.
+// old text byte for byte, N the new text, - nothing.
 void expectContents(const ConfigDir& dir, const char* contents)
 {
     const char* names[] = {"app.ini", "app.bak", "app.new"};
