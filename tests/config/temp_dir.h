@@ -3,9 +3,9 @@
 #ifndef TESSALINE_TESTS_CONFIG_TEMP_DIR_H
 #define TESSALINE_TESTS_CONFIG_TEMP_DIR_H
 
+#include <cstdio>
 #include <fstream>
 #include <iterator>
-#include <regex>
 #include <string>
 
 #include <sys/stat.h>
@@ -53,10 +53,16 @@ public:
 // only one and the last line.
 inline std::string body(const std::string& text)
 {
-    static const std::regex idLine("# Edited by Tessaline: [A-Z][a-z]+ [0-9]{2}, [0-9]{4} - [0-9:]{8}\n$");
-    std::smatch match;
-    EXPECT_TRUE(std::regex_search(text, match, idLine)) << text;
-    const std::string rest = text.substr(0, text.size() - match.length());
+    const std::size_t start = text.size() < 2 ? 0 : text.rfind('\n', text.size() - 2) + 1;
+    const std::string last = text.substr(start);
+    char month[16];
+    int day, year, hour, minute, second, end = 0;
+    EXPECT_EQ(std::sscanf(last.c_str(), "# Edited by Tessaline: %15[A-Za-z] %2d, %4d - %2d:%2d:%2d%n", month, &day,
+                          &year, &hour, &minute, &second, &end),
+              6)
+        << text;
+    EXPECT_EQ(last.substr(std::size_t(end)), "\n") << text;
+    const std::string rest = text.substr(0, start);
     EXPECT_EQ(rest.find("Edited by"), std::string::npos) << text;
     return rest;
 }
