@@ -3,12 +3,15 @@
 #ifndef TESSALINE_TESTS_CONFIG_TEMP_DIR_H
 #define TESSALINE_TESTS_CONFIG_TEMP_DIR_H
 
+#include <cstdio>
 #include <fstream>
 #include <iterator>
 #include <string>
 
 #include <sys/stat.h>
 #include <unistd.h>
+
+#include <gtest/gtest.h>
 
 #include "support/temp_dir.h"
 
@@ -45,6 +48,24 @@ public:
         return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
     }
 };
+
+// A written file's text without its identification line, which must be the
+// only one and the last line.
+inline std::string body(const std::string& text)
+{
+    const std::size_t start = text.size() < 2 ? 0 : text.rfind('\n', text.size() - 2) + 1;
+    const std::string last = text.substr(start);
+    char month[16];
+    int day, year, hour, minute, second, end = 0;
+    EXPECT_EQ(std::sscanf(last.c_str(), "# Edited by Tessaline: %15[A-Za-z] %2d, %4d - %2d:%2d:%2d%n", month, &day,
+                          &year, &hour, &minute, &second, &end),
+              6)
+        << text;
+    EXPECT_EQ(last.substr(std::size_t(end)), "\n") << text;
+    const std::string rest = text.substr(0, start);
+    EXPECT_EQ(rest.find("Edited by"), std::string::npos) << text;
+    return rest;
+}
 
 }  // namespace tessaline::test
 
