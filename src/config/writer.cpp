@@ -1,5 +1,6 @@
 // Saving: Flush and the writing pass, which merges the tables into the old
 // file's lines and hands the result to the durable replacement.
+#include <algorithm>
 #include <cstdio>
 #include <cstring>
 #include <ctime>
@@ -58,9 +59,10 @@ public:
             return;
         }
         char* line = m_buffer.get() + m_used;
-        std::memcpy(line, key, keyLength);
-        std::memcpy(line + keyLength, " = ", 3);
-        std::memcpy(line + keyLength + 3, value, valueLength);
+        // A line, not a string: no NUL follows it in the buffer.
+        std::copy_n(key, keyLength, line);
+        std::copy_n(" = ", 3, line + keyLength);
+        std::copy_n(value, valueLength, line + keyLength + 3);
         line[keyLength + valueLength + 3] = '\n';
         m_used += keyLength + valueLength + 4;
     }

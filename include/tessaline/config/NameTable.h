@@ -490,7 +490,9 @@ private:
         if (capacity <= m_slotMask + 1 && m_slots != nullptr) {
             return;
         }
-        void* block = ::operator new(capacity*(sizeof(Node*) + sizeof(unsigned short)));
+        // One block: the slots, then their tags.
+        // NOLINTNEXTLINE(bugprone-sizeof-expression): an array of pointers.
+        void* block = ::operator new(capacity * (sizeof(Node*) + sizeof(unsigned short)));
         Node** slots = static_cast<Node**>(block);
         std::fill(slots, slots + capacity, nullptr);
         Node** old = m_slots;
