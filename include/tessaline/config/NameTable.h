@@ -94,6 +94,8 @@ class NameTable {
     struct Node;
 
 public:
+    /// The names a host's code spells the table's types with.
+    ///@{
     typedef Key key_type;
     typedef Mapped data_type;
     typedef Mapped mapped_type;
@@ -106,15 +108,21 @@ public:
     typedef const value_type* const_pointer;
     typedef BucketHash hasher;
     typedef Equal key_equal;
+    ///@}
 
+    /// Walks the entries in bucket order, each chain from its head; the
+    /// const form when IsConst. Valid while its entry stays in the table.
     template <bool IsConst>
     class basic_iterator {
     public:
+        /// A forward iterator's traits.
+        ///@{
         typedef std::forward_iterator_tag iterator_category;
         typedef typename NameTable::value_type value_type;
         typedef std::ptrdiff_t difference_type;
         typedef std::conditional_t<IsConst, const value_type, value_type>* pointer;
         typedef std::conditional_t<IsConst, const value_type, value_type>& reference;
+        ///@}
 
         /// Stands on no table; only assignment and comparison are defined.
         basic_iterator() = default;
@@ -124,6 +132,8 @@ public:
         {
         }
 
+        /// The entry; the next in bucket order; whether two stand on one entry.
+        ///@{
         reference operator*() const { return m_node->value; }
         pointer operator->() const { return &m_node->value; }
         basic_iterator& operator++()
@@ -139,6 +149,7 @@ public:
         }
         friend bool operator==(const basic_iterator& a, const basic_iterator& b) { return a.m_node == b.m_node; }
         friend bool operator!=(const basic_iterator& a, const basic_iterator& b) { return a.m_node != b.m_node; }
+        ///@}
 
     private:
         friend class NameTable;
@@ -148,19 +159,25 @@ public:
         Node* m_node = nullptr;
         const NameTable* m_table = nullptr;
     };
+    /// The mutable and the const iterator.
+    ///@{
     typedef basic_iterator<false> iterator;
     typedef basic_iterator<true> const_iterator;
+    ///@}
 
     /// Empty, with room for `hint` entries before growing (193 buckets for
     /// the default hint of 100).
     explicit NameTable(size_type hint = 100) { m_bucketCount = NextBucketCount(hint); }
+    /// A copy with the same bucket count and the same order in every chain.
     NameTable(const NameTable& other) : m_bucketCount(other.m_bucketCount) { CopyFrom(other, Counted()); }
     /// A copy whose entries borrow those of `other` (see BorrowingCopy).
     NameTable(const NameTable& other, BorrowingCopy borrowing) : m_bucketCount(other.m_bucketCount)
     {
         CopyFrom(other, borrowing);
     }
+    /// Takes `other`'s entries and leaves it empty.
     NameTable(NameTable&& other) noexcept : m_bucketCount(NextBucketCount(100)) { swap(other); }
+    /// Becomes a copy of `other`, as the copy constructor makes it.
     NameTable& operator=(const NameTable& other)
     {
         if (this != &other) {
@@ -169,6 +186,7 @@ public:
         }
         return *this;
     }
+    /// Takes `other`'s entries and leaves it empty.
     NameTable& operator=(NameTable&& other) noexcept
     {
         NameTable gone(std::move(other));
@@ -177,27 +195,39 @@ public:
     }
     ~NameTable() { Release(); }
 
+    /// The number of entries, whether there are none, the most there can be,
+    /// the bucket count, and the hash and equality objects.
+    ///@{
     size_type size() const { return m_size; }
     bool empty() const { return m_size == 0; }
     size_type max_size() const { return size_type(-1) / sizeof(Node); }
     size_type bucket_count() const { return m_bucketCount; }
     hasher hash_funct() const { return hasher(); }
     key_equal key_eq() const { return key_equal(); }
+    ///@}
 
+    /// The first entry in bucket order, and the end.
+    ///@{
     iterator begin() { return iterator(FirstNode(), this); }
     iterator end() { return iterator(); }
     const_iterator begin() const { return const_iterator(FirstNode(), this); }
     const_iterator end() const { return const_iterator(); }
+    ///@}
 
+    /// The entry whose name equals `name` without regard to case, or end();
+    /// count() is 1 or 0.
+    ///@{
     iterator find(const key_type& name) { return iterator(FindNode(name), this); }
     const_iterator find(const key_type& name) const { return const_iterator(FindNode(name), this); }
-    /// As find(key_type(name)), without making a key: null is "".
     iterator find(const char* name) { return iterator(FindText(name), this); }
     const_iterator find(const char* name) const { return const_iterator(FindText(name), this); }
     size_type count(const key_type& name) const { return FindNode(name) != nullptr ? 1 : 0; }
+    ///@}
 
     /// Grows for one more entry, then adds `entry` unless an equal name is
     /// there: the iterator of the entry with that name, and whether it is new.
+    /// The range form inserts each entry in turn.
+    ///@{
     std::pair<iterator, bool> insert(const value_type& entry) { return Emplace(entry.first, entry); }
     std::pair<iterator, bool> insert(value_type&& entry) { return Emplace(entry.first, std::move(entry)); }
     template <class InputIterator>
@@ -207,6 +237,7 @@ public:
             insert(*first);
         }
     }
+    ///@}
 
     /// Adds `name` with a value made from `args` unless an equal name is
     /// there, growing first as insert does; nothing is made for a name that
@@ -222,7 +253,9 @@ public:
     /// when the name is there.
     mapped_type& operator[](const key_type& name) { return try_emplace(name).first->second; }
 
-    /// Removes the entry with `name`: 1, or 0 if there is none.
+    /// Removes the entry with `name` (1, or 0 if there is none), the entry at
+    /// an iterator, or a range; other entries keep their places.
+    ///@{
     size_type erase(const key_type& name) { return EraseNode(FindNode(name)); }
     size_type erase(const char* name) { return EraseNode(FindText(name)); }
     void erase(iterator position) { EraseNode(position.m_node); }
@@ -233,6 +266,7 @@ public:
             erase(first++);
         }
     }
+    ///@}
 
     /// Removes every entry; the bucket count stays.
     void clear()
@@ -250,6 +284,7 @@ public:
         }
     }
 
+    /// Exchanges the entries, bucket counts and indexes of two tables.
     void swap(NameTable& other) noexcept
     {
         std::swap(m_buckets, other.m_buckets);
@@ -271,6 +306,7 @@ public:
     /// The entry with the name `text` of `length` bytes whose FoldedNameHash
     /// is `fold`, or end(): the lookup without a key for the library's own
     /// passes. The entry found is remembered for FindRecent.
+    ///@{
     iterator FindEntry(const char* text, size_type length, unsigned int fold)
     {
         return iterator(Remember(FindNode(text, length, fold)), this);
@@ -279,10 +315,12 @@ public:
     {
         return const_iterator(Remember(FindNode(text, length, fold)), this);
     }
+    ///@}
 
     /// As FindEntry, for a caller that asks for one name many times in a
     /// row: the entry found last is compared first, and the name's hash is
     /// not computed for it. `fold()` gives FoldedNameHash of the name.
+    ///@{
     template <class Fold>
     iterator FindRecent(const char* text, size_type length, Fold fold)
     {
@@ -293,6 +331,7 @@ public:
     {
         return const_iterator(FindRecentNode(text, length, fold), this);
     }
+    ///@}
 
 private:
     struct Node {
@@ -492,7 +531,7 @@ private:
         }
         // One block: the slots, then their tags.
         // NOLINTNEXTLINE(bugprone-sizeof-expression): an array of pointers.
-        void* block = ::operator new(capacity * (sizeof(Node*) + sizeof(unsigned short)));
+        void* block = ::operator new(capacity*(sizeof(Node*) + sizeof(unsigned short)));
         Node** slots = static_cast<Node**>(block);
         std::fill(slots, slots + capacity, nullptr);
         Node** old = m_slots;
@@ -713,6 +752,7 @@ private:
     char* m_unusedEnd = nullptr;
 };
 
+/// Exchanges two tables, as a.swap(b).
 template <class Key, class Mapped, class BucketHash, class Equal>
 void swap(NameTable<Key, Mapped, BucketHash, Equal>& a, NameTable<Key, Mapped, BucketHash, Equal>& b) noexcept
 {

@@ -146,10 +146,12 @@ public:
             }
             return reinterpret_cast<const char*>(text + 1);
         }
-        /// The length of c_str().
+        /// The length of c_str(), and whether it is 0.
+        ///@{
         std::size_t size() const noexcept { return m_bits == 0 ? 0 : Get()->length & ~kRopeText; }
         std::size_t length() const noexcept { return size(); }
         bool empty() const noexcept { return m_bits == 0; }
+        ///@}
 
         /// The text as a rope: shared when it came from a rope, else copied.
         operator __gnu_cxx::crope() const;
