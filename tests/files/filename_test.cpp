@@ -136,7 +136,7 @@ TEST(rvFilenameJoin, SeparatorsAndSetters)
     EXPECT_STREQ(joined.Join(nullptr, "host", "/share\\", "f", "txt"), "//host/share/f.txt");
 
     rvFilename name("/a/b.txt", 0);
-    EXPECT_STREQ(name.Ext("dat"), "/a/b.dat");
+    EXPECT_STREQ(name.Ext("data"), "/a/b.data");
     EXPECT_STREQ(name.Ext(nullptr), "/a/b");
     name = "/a/b.txt";
     EXPECT_STREQ(name.File("c.d"), "/a/c.d.txt");

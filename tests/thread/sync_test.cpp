@@ -75,6 +75,19 @@ TEST(MMutex, RecursiveHolderNeedsAsManyUnlocksAsLocks)
     EXPECT_TRUE(FreeElsewhere(mutex));
 }
 
+// A plain mutex is the platform's, with or without an err to fill.
+TEST(MMutex, PlainLockIsHeldUntilUnlock)
+{
+    MMutex mutex(MMutex_::MutexPlain);
+    int err = -1;
+    for (int* e : {static_cast<int*>(nullptr), &err}) {
+        ASSERT_EQ(0, mutex.Lock(e));
+        EXPECT_FALSE(FreeElsewhere(mutex));
+        EXPECT_EQ(0, mutex.Unlock(e));
+        EXPECT_TRUE(FreeElsewhere(mutex));
+    }
+}
+
 // Unlock of a tracked mutex that nobody holds gives 3; by a thread that is
 // not the holder, -2, and the holder keeps it. A checked mutex refuses its
 // holder's second Lock and everyone else with 2 instead of queueing them.
