@@ -56,12 +56,6 @@ DirectoryFd& DirectoryFd::operator=(DirectoryFd&& other) noexcept
     return *this;
 }
 
-DirectoryFd OpenDirectory(const Place& place, Links links)
-{
-    const int flags = O_RDONLY | O_DIRECTORY | O_CLOEXEC | (links == Links::kRefuse ? O_NOFOLLOW : 0);
-    return DirectoryFd(Sys().openat(place.directory, place.name, flags, 0));
-}
-
 int IsDirectoryAt(const Place& place)
 {
     if (place.IsHost()) {

@@ -168,6 +168,39 @@ TEST(Unlink, FilesTreesWildcardsAndLinks)
     EXPECT_EQ(CouldNotRemove(dir / "t", EISDIR) + CouldNotRemove(dir / "t/stuck", EACCES), capture.Text());
 }
 
+const tessaline::files::SysCalls kReal = Sys();
+std::set<int> g_held;  // the directory descriptors a walk holds
+size_t g_mostHeld = 0;
+
+// A walk holds at most 32 directories open. Where ".." cannot be opened on
+// the way up, it reopens each upper level by name, and checks that it is
+// still the directory it left.
+TEST(Unlink, DeepTreesWithoutDotDot)
+{
+    TempDir dir;
+    std::string path = dir / "t";
+    for (int level = 0; level < 40; ++level, path += "/d") {
+        Put(path + "/f", "x");
+    }
+    tessaline::testing::ScopedSysCalls restore(Sys());
+    Sys().openat = [](int at, const char* name, int flags, mode_t mode) {
+        if (std::strcmp(name, "..") == 0) {
+            errno = EACCES;
+            return -1;
+        }
+        const int fd = kReal.openat(at, name, flags, mode);
+        if (fd >= 0 && (flags & O_DIRECTORY) != 0 && std::strcmp(name, ".") != 0) {
+            g_held.insert(fd);
+            g_mostHeld = std::max(g_mostHeld, g_held.size());
+        }
+        return fd;
+    };
+    Sys().close = [](int fd) { return g_held.erase(fd), kReal.close(fd); };
+    EXPECT_EQ(40, rvUnlink((dir / "t").c_str(), 1));
+    EXPECT_FALSE(Exists(dir / "t"));
+    EXPECT_EQ(32u, g_mostHeld);
+}
+
 TEST(Sizes, TreesCompareOneWayAndFilesBySize)
 {
     TempDir dir;
@@ -187,9 +220,17 @@ TEST(Sizes, TreesCompareOneWayAndFilesBySize)
     Put(dir / "b/sub/two", "longer");
     EXPECT_EQ(0, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "a deeper size differs";
     Put(dir / "b/sub/two", "de");
-    std::filesystem::create_directory(dir / "a/kind");
-    Put(dir / "b/kind", "");
+    fs::create_directory_symlink("sub", dir / "a/linked");
+    Put(dir / "b/linked/two", "..");
+    EXPECT_EQ(1, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "through a link to a directory";
+    // A directory never matches a file, not even one of the directory's size.
+    fs::create_directory(dir / "a/kind");
+    struct stat kind;
+    ASSERT_EQ(0, stat((dir / "a/kind").c_str(), &kind));
+    Put(dir / "b/kind", std::string(static_cast<size_t>(kind.st_size), '.'));
     EXPECT_EQ(0, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "directory against file";
+    fs::remove(dir / "b/extra");
+    EXPECT_EQ(0, CompareDirectoriesByFileSize(b.c_str(), a.c_str())) << "file against directory";
 
     EXPECT_EQ(2, rvGetFileSize((dir.path() + "\\b\\sub\\two").c_str())) << "backslashes";
     EXPECT_EQ(0, rvGetFileSize((dir / "none").c_str()));
