@@ -2,8 +2,12 @@
 // default sections, enumeration and its order, removal, and the typed
 // accessors.
 #include <algorithm>
+#include <cstdlib>
 #include <string>
+#include <utility>
 #include <vector>
+
+#include <locale.h>
 
 #include <gtest/gtest.h>
 
@@ -107,6 +111,40 @@ TEST(RvConfigModel, LookupStoreRemoveAndCounters)
     EXPECT_EQ(std::string(config), std::string(4094, 'n'));
     config.PutValue("k", "v", "");  // the current section is now ""
     EXPECT_EQ(config.TokenCnt(""), 1u);
+}
+
+// Which names are one is strcasecmp's answer in the thread's locale. Where
+// that folds more than A-Z, as Latin-1 folds \xc4 to \xe4, lookups follow it.
+TEST(RvConfigModel, NamesFoldAsTheThreadsLocaleFolds)
+{
+    using tessaline::config::AsciiCaseFolding;
+    using tessaline::config::AsciiFoldedEqual;
+    EXPECT_TRUE(AsciiCaseFolding());
+    EXPECT_TRUE(AsciiCaseFolding());  // now from the table last checked
+    EXPECT_TRUE(AsciiFoldedEqual("Key_1", "kEY_1"));
+    for (const auto& pair : {std::pair{"key", "kez"}, {"[", "{"}, {"@", "`"}, {"k", "k\xe4"}, {"\xc4", "\xe4"}}) {
+        EXPECT_FALSE(AsciiFoldedEqual(pair.first, pair.second)) << pair.first << " " << pair.second;
+    }
+    rvConfig config;
+    config.PutValue("\xc4pfel", "1", "Obst");
+    EXPECT_EQ(lookup(config, "\xe4pfel", "obst"), nullptr);
+
+    const tessaline::test::ConfigDir dir;
+    const std::string build = "localedef -i de_DE -f ISO-8859-1 " + dir.Path("de_DE.ISO-8859-1") + " 2>/dev/null";
+    setenv("LOCPATH", dir.path().c_str(), 1);
+    const locale_t latin1 =
+        std::system(build.c_str()) == 0 ? newlocale(LC_CTYPE_MASK, "de_DE.ISO-8859-1", nullptr) : nullptr;
+    unsetenv("LOCPATH");
+    if (latin1 == nullptr) {
+        GTEST_SKIP() << "no Latin-1 locale could be built";
+    }
+    const locale_t previous = uselocale(latin1);
+    const bool folding = AsciiCaseFolding();
+    const char* found = lookup(config, "\xe4PFEL", "OBST");
+    uselocale(previous);
+    freelocale(latin1);
+    EXPECT_FALSE(folding);
+    EXPECT_STREQ(found, "1");
 }
 
 TEST(RvConfigEnumerate, OneCursorThatRestartsAfterTheEnd)

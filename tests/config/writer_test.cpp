@@ -15,6 +15,7 @@
 
 #include <gtest/gtest.h>
 
+#include "config/side_name.h"
 #include "config/sys.h"
 #include "config/temp_dir.h"
 #include "support/capture_stderr.h"
@@ -493,6 +494,51 @@ TEST(RvConfigWriter, BackupsNeverTakeTheFilesOwnName)
         EXPECT_EQ(body(dir.Read(row.backup)), "k = 2\n");  // the file before the last write
     }
     rvConfig::m_bBackups = 0;
+}
+
+std::vector<ino_t> g_syncedDirectories;
+
+// The renames reach the disk through one sync of the directory, also for a
+// host that closed its standard input, whose descriptor the directory gets.
+TEST(RvConfigWriter, FlushSyncsTheDirectoryOnce)
+{
+    ConfigDir dir;
+    rvConfig config(dir.Write("app.ini", "k = 1\n").c_str(), rvConfig::OpenUpdate);
+    config.PutValue("k", "2", "");
+    struct stat directory;
+    ASSERT_EQ(stat(dir.path().c_str(), &directory), 0);
+    ScopedSysCalls<SysCalls> calls(Sys());
+    Sys().fsync = [](int fd) {
+        struct stat info;
+        if (fstat(fd, &info) == 0 && S_ISDIR(info.st_mode)) {
+            g_syncedDirectories.push_back(info.st_ino);
+        }
+        return kReal.fsync(fd);
+    };
+    const int input = dup(STDIN_FILENO);
+    close(STDIN_FILENO);
+    const unsigned int result = config.Flush(0);
+    dup2(input, STDIN_FILENO);
+    close(input);
+    EXPECT_EQ(result, 1u);
+    EXPECT_EQ(g_syncedDirectories, std::vector<ino_t>{directory.st_ino});
+}
+
+// Whatever the name, and even with an odd extension, a side file is the
+// name with its extension replaced or one added, beside it, never the file.
+TEST(RvConfigWriter, SideFilesStayBesideTheFile)
+{
+    for (const std::string name : {"app.ini", "d.d/app", "a.b.c", "x.", "a\\b.ini", "a//\\", "?/", "\\"}) {
+        for (const char* ext : {"bak", "\\", ""}) {
+            const std::string side = tessaline::config::SideFileName(name, ext);
+            const std::size_t file = name.rfind('/') + 1;
+            const std::size_t dot = name.rfind('.');
+            const std::string replaced =
+                name.substr(0, dot != std::string::npos && dot >= file ? dot : std::string::npos);
+            EXPECT_TRUE(side != name && (side == replaced + "." + ext || side == name + "." + ext))
+                << name << " with " << ext << ": " << side;
+        }
+    }
 }
 
 TEST(RvConfigWriter, RefusalsLeaveEverything)

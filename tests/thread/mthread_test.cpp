@@ -110,6 +110,11 @@ TEST(MThread, TimedWaitRunsOutThenWaitJoinsAndDeliversTheResult)
     EXPECT_EQ(ETIMEDOUT, thread.LastError());
     EXPECT_EQ(nullptr, result);
 
+    // A join that fails leaves the thread to a later Wait.
+    Sys().pthread_join = [](pthread_t, void**) { return EDEADLK; };
+    EXPECT_EQ(-1, thread.Wait(&result, nullptr, -1));
+    EXPECT_EQ(EDEADLK, thread.LastError());
+
     // While a Wait joins, a Detach and another Wait are refused.
     g_joined = &thread;
     Sys().pthread_join = [](pthread_t target, void** value) {
@@ -119,7 +124,7 @@ TEST(MThread, TimedWaitRunsOutThenWaitJoinsAndDeliversTheResult)
     gate.open.Signal();
     EXPECT_EQ(0, thread.Wait(&result, nullptr, 0));
     EXPECT_EQ(Refusals({-1, EINVAL, -1}), g_refusals);
-    EXPECT_EQ(Line(EBUSY) + Line(EINVAL) + Line(EINVAL), capture.Text());
+    EXPECT_EQ(Line(EBUSY) + Line(EDEADLK) + Line(EINVAL) + Line(EINVAL), capture.Text());
     EXPECT_EQ(&g_answer, result);
     EXPECT_EQ(0UL, static_cast<unsigned long>(thread));
     EXPECT_FALSE(thread.Exists());
@@ -135,6 +140,7 @@ TEST(MThread, ObjectWithoutAThread)
     EXPECT_EQ(-4, thread.Suspend());
     EXPECT_EQ(-4, thread.Resume());
     EXPECT_EQ(0, thread.Pause(nullptr, 0));
+    EXPECT_EQ(0, thread.Pause(nullptr, -1));  // not a wrap into a pause of 71 minutes
 
     CaptureStderr capture;
     thread.Cancel();
@@ -143,9 +149,13 @@ TEST(MThread, ObjectWithoutAThread)
     EXPECT_EQ(-6, thread.Pause(nullptr, 0));
     {
         // A failed start leaves the object as it was, and EAGAIN is silent.
+        // The stack size asked for is in the attributes of the start.
         ScopedSysCalls restore(Sys());
-        Sys().pthread_create = [](pthread_t*, const pthread_attr_t*, void* (*)(void*), void*) { return EAGAIN; };
-        EXPECT_EQ(-1, thread.Create(WaitAtGate, nullptr, 0, 0, 0, nullptr));
+        Sys().pthread_create = [](pthread_t*, const pthread_attr_t* attr, void* (*)(void*), void*) {
+            size_t size = 0;
+            return pthread_attr_getstacksize(attr, &size) == 0 && size == 1 << 20 ? EAGAIN : EINVAL;
+        };
+        EXPECT_EQ(-1, thread.Create(WaitAtGate, nullptr, 1 << 20, 0, 0, nullptr));
         EXPECT_EQ(EAGAIN, thread.LastError());
         EXPECT_EQ(0, thread.m_state);
     }

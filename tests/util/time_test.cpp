@@ -123,4 +123,5 @@ TEST(RvTimeSpan, Overlap)
     EXPECT_EQ(2, overlap(12, 14, 10, 20));  // a inside b
     EXPECT_EQ(0, overlap(10, 20, 25, 30));  // a ends before b starts
     EXPECT_EQ(0, overlap(25, 30, 10, 20));  // a starts after b ends
+    EXPECT_EQ(0, overlap(10, 20, 10, 5));   // equal starts: a's rule, which sees b end first
 }
