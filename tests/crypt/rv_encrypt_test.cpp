@@ -97,7 +97,7 @@ TEST(TextForms, DecryptingEveryShapeOfText)
     const Row rows[] = {
         {"clear text", nullptr, "hello", 256, "hello", 5, false},
         {"clear text and its NUL just fit", nullptr, "hello", 6, "hello", 5, false},
-        {"clear text cut short keeps the capacity", nullptr, "hello", 3, "he", 3, false},
+        {"clear text one short of its NUL is cut", nullptr, "hello", 5, "hell", 5, false},
         {"room for the NUL only", nullptr, "hello", 1, "", 1, false},
         {"capacity 0 counts as 1", nullptr, "hello", 0, "", 0, false},
         {"empty text leaves the length alone", nullptr, "", 99, "", 99, false},

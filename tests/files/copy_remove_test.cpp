@@ -1,4 +1,6 @@
 // Copying, moving, linking, removing and comparing files and trees.
+#include <climits>
+
 #include "files/file_fixtures.h"
 #include "files/sys.h"
 #include "support/capture_stderr.h"
@@ -171,34 +173,49 @@ TEST(Unlink, FilesTreesWildcardsAndLinks)
 const tessaline::files::SysCalls kReal = Sys();
 std::set<int> g_held;  // the directory descriptors a walk holds
 size_t g_mostHeld = 0;
+int g_checks = 0;      // fstat calls so far
+int g_checksThatWork;  // after these, fstat fills its answer but fails
 
 // A walk holds at most 32 directories open. Where ".." cannot be opened on
-// the way up, it reopens each upper level by name, and checks that it is
-// still the directory it left.
+// the way up, it reopens each upper level by name, and uses it only once it
+// has checked that it is still the directory it left.
 TEST(Unlink, DeepTreesWithoutDotDot)
 {
-    TempDir dir;
-    std::string path = dir / "t";
-    for (int level = 0; level < 40; ++level, path += "/d") {
-        Put(path + "/f", "x");
+    for (const bool checksFail : {false, true}) {
+        TempDir dir;
+        std::string path = dir / "t";
+        for (int level = 0; level < 40; ++level, path += "/d") {
+            Put(path + "/f", "x");
+        }
+        g_checks = 0;
+        g_checksThatWork = checksFail ? 40 : INT_MAX;  // one for each level on the way down
+        tessaline::testing::ScopedSysCalls restore(Sys());
+        Sys().openat = [](int at, const char* name, int flags, mode_t mode) {
+            if (std::strcmp(name, "..") == 0) {
+                errno = EACCES;
+                return -1;
+            }
+            const int fd = kReal.openat(at, name, flags, mode);
+            if (fd >= 0 && (flags & O_DIRECTORY) != 0 && std::strcmp(name, ".") != 0) {
+                g_held.insert(fd);
+                g_mostHeld = std::max(g_mostHeld, g_held.size());
+            }
+            return fd;
+        };
+        Sys().close = [](int fd) { return g_held.erase(fd), kReal.close(fd); };
+        Sys().fstat = [](int fd, struct stat* info) {
+            const int result = kReal.fstat(fd, info);
+            return ++g_checks > g_checksThatWork ? (errno = EIO, -1) : result;
+        };
+        const int removed = rvUnlink((dir / "t").c_str(), 1);
+        if (checksFail) {
+            EXPECT_TRUE(Exists(dir / "t/d")) << "a level that cannot be checked again is left alone";
+        } else {
+            EXPECT_EQ(40, removed);
+            EXPECT_FALSE(Exists(dir / "t"));
+            EXPECT_EQ(32u, g_mostHeld);
+        }
     }
-    tessaline::testing::ScopedSysCalls restore(Sys());
-    Sys().openat = [](int at, const char* name, int flags, mode_t mode) {
-        if (std::strcmp(name, "..") == 0) {
-            errno = EACCES;
-            return -1;
-        }
-        const int fd = kReal.openat(at, name, flags, mode);
-        if (fd >= 0 && (flags & O_DIRECTORY) != 0 && std::strcmp(name, ".") != 0) {
-            g_held.insert(fd);
-            g_mostHeld = std::max(g_mostHeld, g_held.size());
-        }
-        return fd;
-    };
-    Sys().close = [](int fd) { return g_held.erase(fd), kReal.close(fd); };
-    EXPECT_EQ(40, rvUnlink((dir / "t").c_str(), 1));
-    EXPECT_FALSE(Exists(dir / "t"));
-    EXPECT_EQ(32u, g_mostHeld);
 }
 
 TEST(Sizes, TreesCompareOneWayAndFilesBySize)
