@@ -145,6 +145,12 @@ TEST(Unlink, FilesTreesWildcardsAndLinks)
     EXPECT_TRUE(Exists(dir / "t")) << "the directory of the pattern stays";
     EXPECT_EQ(0, rvUnlink((dir / "t").c_str(), 1)) << "an empty directory counts nothing";
     EXPECT_FALSE(Exists(dir / "t"));
+    Put(dir / "rel/sub/f", "1");
+    {
+        ScopedCwd cwd(dir.path());
+        EXPECT_EQ(1, rvUnlink("rel", 1));
+    }
+    EXPECT_FALSE(Exists(dir / "rel")) << "a tree named relative to the working directory";
 
     // A link to a directory goes as a link; a dangling one fails the
     // existence test, which follows links, and stays in silence.
