@@ -235,6 +235,11 @@ TEST(Sizes, TreesCompareOneWayAndFilesBySize)
     const std::string a = dir / "a";
     const std::string b = dir / "b";
     EXPECT_EQ(1, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "sizes, not contents";
+    const int input = dup(STDIN_FILENO);
+    close(STDIN_FILENO);
+    EXPECT_EQ(1, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "a directory on descriptor 0";
+    dup2(input, STDIN_FILENO);
+    close(input);
     EXPECT_EQ(0, CompareDirectoriesByFileSize(b.c_str(), a.c_str())) << "one-way";
     EXPECT_EQ(1, CompareDirectoriesByFileSize((dir.path() + "\\a").c_str(), (dir.path() + "\\b\\").c_str()))
         << "backslashes separate as slashes do";

@@ -151,6 +151,8 @@ TEST(FaultInjection, OldDataAndResultsUnderFailures)
         {"target open refused (EACCES)", {{kOpenTarget, 1, -EACCES}}, kReplace, 0, kOld},
         {"missing source", {}, kFromMissing, 0, kOld},
         {"source open fails (EIO)", {{kOpenSource, 1, -EIO}}, kReplace, 0, kOld},
+        {"source opens at the second attempt", {{kOpenSource, 1, -EAGAIN}, {kOpenSource, 2, kReally}}, kReplace, 1,
+         kSource},
         {"target directory cannot be made (EROFS)", {{kMkdir, 1, -EROFS}}, kIntoNewDirectory, 0, kOld},
         {"source cannot be examined (fstat fails)", {{kFstat, 1, -EIO}}, kReplace, 0, kOld},
 
