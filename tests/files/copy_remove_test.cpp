@@ -13,6 +13,8 @@ namespace fs = std::filesystem;
 
 namespace {
 
+const tessaline::files::SysCalls kReal = Sys();
+
 int Copy(const std::string& source, const std::string& target, unsigned recurse, unsigned overwrite, unsigned link = 0,
          unsigned move = 0)
 {
@@ -162,21 +164,33 @@ TEST(Unlink, FilesTreesWildcardsAndLinks)
     EXPECT_FALSE(Exists(dir / "to-dir"));
     EXPECT_TRUE(Exists(dir / "real/kept") && Exists(dir / "dangling"));
 
+    // A member listed as a directory that is a file by the time it is
+    // entered goes as a file.
+    Put(dir / "swapped/x", "1");
+    tessaline::testing::ScopedSysCalls restore(Sys());
+    Sys().readdir = [](DIR* directory) {
+        dirent* entry = kReal.readdir(directory);
+        if (entry != nullptr && std::strcmp(entry->d_name, "x") == 0) {
+            entry->d_type = DT_DIR;
+        }
+        return entry;
+    };
+    EXPECT_EQ(0, rvUnlink((dir / "swapped").c_str(), 1));
+    EXPECT_FALSE(Exists(dir / "swapped"));
+    Sys().readdir = kReal.readdir;
+
     // A member that cannot go is reported and skipped.
     Put(dir / "t/stuck", "1");
     Put(dir / "t/free", "2");
-    tessaline::testing::ScopedSysCalls restore(Sys());
-    static const auto realUnlink = Sys().unlinkat;
     Sys().unlinkat = [](int directory, const char* name, int flags) {
         errno = EACCES;
-        return std::strcmp(name, "stuck") == 0 ? -1 : realUnlink(directory, name, flags);
+        return std::strcmp(name, "stuck") == 0 ? -1 : kReal.unlinkat(directory, name, flags);
     };
     EXPECT_EQ(1, rvUnlink((dir / "t").c_str(), 1));
     EXPECT_EQ((std::set<std::string>{"stuck=1"}), Tree(dir / "t"));
     EXPECT_EQ(CouldNotRemove(dir / "t", EISDIR) + CouldNotRemove(dir / "t/stuck", EACCES), capture.Text());
 }
 
-const tessaline::files::SysCalls kReal = Sys();
 std::set<int> g_held;  // the directory descriptors a walk holds
 size_t g_mostHeld = 0;
 int g_checks = 0;      // fstat calls so far
