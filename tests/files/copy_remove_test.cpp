@@ -193,13 +193,15 @@ TEST(Unlink, FilesTreesWildcardsAndLinks)
 
 std::set<int> g_held;  // the directory descriptors a walk holds
 size_t g_mostHeld = 0;
+std::string g_decoy;   // where ".." leads
 int g_checks = 0;      // fstat calls so far
 int g_checksThatWork;  // after these, fstat fills its answer but fails
 
-// A walk holds at most 32 directories open. Where ".." cannot be opened on
-// the way up, it reopens each upper level by name, and uses it only once it
-// has checked that it is still the directory it left.
-TEST(Unlink, DeepTreesWithoutDotDot)
+// A walk holds at most 32 directories open. On the way up it takes ".."
+// only where that is still the level above (here it never is), else reopens
+// each upper level by name, and uses it only once it has checked that it is
+// still the directory it left.
+TEST(Unlink, DeepTreesWhereDotDotLeadsElsewhere)
 {
     for (const bool checksFail : {false, true}) {
         TempDir dir;
@@ -207,13 +209,14 @@ TEST(Unlink, DeepTreesWithoutDotDot)
         for (int level = 0; level < 40; ++level, path += "/d") {
             Put(path + "/f", "x");
         }
+        g_decoy = dir / "decoy";
+        fs::create_directories(g_decoy + "/d");
         g_checks = 0;
         g_checksThatWork = checksFail ? 40 : INT_MAX;  // one for each level on the way down
         tessaline::testing::ScopedSysCalls restore(Sys());
         Sys().openat = [](int at, const char* name, int flags, mode_t mode) {
             if (std::strcmp(name, "..") == 0) {
-                errno = EACCES;
-                return -1;
+                return kReal.openat(AT_FDCWD, g_decoy.c_str(), flags, mode);
             }
             const int fd = kReal.openat(at, name, flags, mode);
             if (fd >= 0 && (flags & O_DIRECTORY) != 0 && std::strcmp(name, ".") != 0) {
@@ -228,6 +231,7 @@ TEST(Unlink, DeepTreesWithoutDotDot)
             return ++g_checks > g_checksThatWork ? (errno = EIO, -1) : result;
         };
         const int removed = rvUnlink((dir / "t").c_str(), 1);
+        EXPECT_TRUE(Exists(g_decoy + "/d"));
         if (checksFail) {
             EXPECT_TRUE(Exists(dir / "t/d")) << "a level that cannot be checked again is left alone";
         } else {
