@@ -1,5 +1,6 @@
 #include <array>
 #include <cerrno>
+#include <chrono>
 #include <csignal>
 #include <string>
 
@@ -141,6 +142,9 @@ TEST(MThread, ObjectWithoutAThread)
     EXPECT_EQ(-4, thread.Resume());
     EXPECT_EQ(0, thread.Pause(nullptr, 0));
     EXPECT_EQ(0, thread.Pause(nullptr, -1));  // not a wrap into a pause of 71 minutes
+    const auto start = std::chrono::steady_clock::now();
+    EXPECT_EQ(0, thread.Pause(nullptr, 20));
+    EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(20));
 
     CaptureStderr capture;
     thread.Cancel();
