@@ -129,6 +129,9 @@ TEST(RvConfigModel, NamesFoldAsTheThreadsLocaleFolds)
     config.PutValue("\xc4pfel", "1", "Obst");
     EXPECT_EQ(lookup(config, "\xe4pfel", "obst"), nullptr);
 
+#ifdef __SANITIZE_ADDRESS__
+    GTEST_SKIP() << "the sanitizer's strcasecmp folds A-Z alone, and newlocale keeps LOCPATH for good";
+#endif
     const tessaline::test::ConfigDir dir;
     const std::string build = "localedef -i de_DE -f ISO-8859-1 " + dir.Path("de_DE.ISO-8859-1") + " 2>/dev/null";
     setenv("LOCPATH", dir.path().c_str(), 1);
