@@ -19,6 +19,7 @@
 #include "config/sys.h"
 #include "config/temp_dir.h"
 #include "support/capture_stderr.h"
+#include "support/closed_stdin.h"
 #include "support/scoped_sys_calls.h"
 #include "tessaline/config/rvConfig.h"
 #include "util/sys.h"
@@ -515,12 +516,10 @@ TEST(RvConfigWriter, FlushSyncsTheDirectoryOnce)
         }
         return kReal.fsync(fd);
     };
-    const int input = dup(STDIN_FILENO);
-    close(STDIN_FILENO);
-    const unsigned int result = config.Flush(0);
-    dup2(input, STDIN_FILENO);
-    close(input);
-    EXPECT_EQ(result, 1u);
+    {
+        tessaline::test::ClosedStdin closed;
+        EXPECT_EQ(config.Flush(0), 1u);
+    }
     EXPECT_EQ(g_syncedDirectories, std::vector<ino_t>{directory.st_ino});
 }
 

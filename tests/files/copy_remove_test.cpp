@@ -4,6 +4,7 @@
 #include "files/file_fixtures.h"
 #include "files/sys.h"
 #include "support/capture_stderr.h"
+#include "support/closed_stdin.h"
 #include "support/scoped_sys_calls.h"
 #include "tessaline/files/rvCopy.h"
 
@@ -253,11 +254,10 @@ TEST(Sizes, TreesCompareOneWayAndFilesBySize)
     const std::string a = dir / "a";
     const std::string b = dir / "b";
     EXPECT_EQ(1, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "sizes, not contents";
-    const int input = dup(STDIN_FILENO);
-    close(STDIN_FILENO);
-    EXPECT_EQ(1, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "a directory on descriptor 0";
-    dup2(input, STDIN_FILENO);
-    close(input);
+    {
+        ClosedStdin closed;
+        EXPECT_EQ(1, CompareDirectoriesByFileSize(a.c_str(), b.c_str())) << "a directory on descriptor 0";
+    }
     EXPECT_EQ(0, CompareDirectoriesByFileSize(b.c_str(), a.c_str())) << "one-way";
     EXPECT_EQ(1, CompareDirectoriesByFileSize((dir.path() + "\\a").c_str(), (dir.path() + "\\b\\").c_str()))
         << "backslashes separate as slashes do";
